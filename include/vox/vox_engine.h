@@ -1,0 +1,13 @@
+/* vox engine SDK: everything an engine author needs, and nothing else.
+ *
+ * An engine is a shared library that exports the _eng_* functions declared in
+ * vox_sdk_engine.h and calls back into vox through the vox_* functions declared in the
+ * family headers below. Include this one header. */
+#ifndef VOX_ENGINE_H
+#define VOX_ENGINE_H
+
+#include "vox_defs.h"
+#include "vox_sdk_core.h"
+#include "vox_sdk_engine.h"
+
+#endif /* VOX_ENGINE_H */

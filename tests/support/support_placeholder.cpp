@@ -1,0 +1,1 @@
+// Placeholder until shared test helpers land.
