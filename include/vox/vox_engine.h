@@ -9,5 +9,8 @@
 #include "vox_defs.h"
 #include "vox_sdk_core.h"
 #include "vox_sdk_engine.h"
+#include "vox_sdk_leap.h"
+#include "vox_sdk_ephemeris.h"
+#include "vox_sdk_results.h"
 
 #endif /* VOX_ENGINE_H */

@@ -1,0 +1,2 @@
+// POSIX implementation of platform.h: fault_guard.
+#include "platform/platform.h"

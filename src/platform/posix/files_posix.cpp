@@ -1,0 +1,2 @@
+// POSIX implementation of platform.h: files.
+#include "platform/platform.h"

@@ -1,0 +1,2 @@
+// POSIX implementation of platform.h: library.
+#include "platform/platform.h"

@@ -1,0 +1,2 @@
+// POSIX implementation of platform.h: system.
+#include "platform/platform.h"

@@ -1,0 +1,2 @@
+// POSIX implementation of platform.h: threads.
+#include "platform/platform.h"
