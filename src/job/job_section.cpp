@@ -103,7 +103,8 @@ int32_t ParseIntBlankTolerant(std::string_view text) {
   return static_cast<int32_t>(negative ? 0u - digits : digits);
 }
 
-double ParseDouble(std::string_view text) {
+double ParseDouble(std::string_view text, size_t* consumed) {
+  if (consumed != nullptr) *consumed = 0;
   text = text.substr(0, 63);
   size_t pos = 0;
   while (pos < text.size() && IsWhiteSpace(text[pos]))
@@ -136,6 +137,7 @@ double ParseDouble(std::string_view text) {
   } else if (result.ec != std::errc()) {
     return 0.0;
   }
+  if (consumed != nullptr) *consumed = static_cast<size_t>(result.ptr - text.data());
   return negative ? -value : value;
 }
 

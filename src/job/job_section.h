@@ -60,7 +60,9 @@ int32_t ParseIntBlankTolerant(std::string_view text);
 
 // Classic-locale conversion of at most the first 63 bytes: leading white space, a sign and an
 // exponent are accepted; bytes after the number are ignored; no number gives 0.
-double ParseDouble(std::string_view text);
+// consumed, when given, receives the count of bytes up to the end of the number (0 when
+// there is no number).
+double ParseDouble(std::string_view text, size_t* consumed = nullptr);
 
 // Narrowing to float with magnitudes below the smallest normal float flushed to 0.
 float NarrowToFloat(double value);
