@@ -1,11 +1,17 @@
 // The engine log: the plain-text trace file that the whole library writes to, and the
 // message operation that writes a line to it while keeping the host responsive.
 //
-// The log is one shared file written without a lock (lines from several threads may
-// interleave); the run room opens a fresh one for every run call and closes it at the end of
-// the job. With no log open every operation here is a cheap no-op.
+// The log is one shared file; lines from several threads may interleave. The run room opens
+// a fresh one for every run call and closes it at the end of the job. With no log open every
+// operation here is a cheap no-op.
+//
+// Threads: Trace and Message may be called from any thread at any time. Writers hold a
+// shared lock only while writing, and replacing or closing the log takes it exclusively, so
+// a log is never closed under a thread that is still writing to it. A run call that is
+// refused while a job runs must not replace the running job's log: it uses OpenSideLog.
 #pragma once
 
+#include <cstdarg>
 #include <cstdio>
 #include <string>
 
@@ -34,5 +40,14 @@ void PumpMessages();
 std::string OpenEngineLog();
 void CloseEngineLog();
 bool EngineLogIsOpen();
+
+// The va_list form of Trace.
+void TraceV(const char* format, va_list arguments);
+
+// Opens a log file chosen exactly as OpenEngineLog chooses it (so a refused run call also
+// leaves its one "OUT" file when the "engine" folder exists) without touching the open log.
+// The caller writes to it and closes it with std::fclose. Null if nothing could be opened;
+// path (optional) receives the path of the file.
+FILE* OpenSideLog(std::string* path = nullptr);
 
 }  // namespace vox
