@@ -1,0 +1,135 @@
+#include "results/result_file.h"
+
+#include <cstring>
+#include <vector>
+
+#include "base/le.h"
+#include "platform/platform.h"
+#include "results/plot_description.h"
+#include "results/record_builder.h"
+
+namespace vox {
+namespace {
+
+constexpr size_t kFrameBytes = 5;  // kind, leading length, trailing length
+constexpr uint32_t kModeWrite = 2;
+
+// The on-disk payload of a plot line description handed over in memory form; empty when
+// `count` is too short to hold the description's fixed part.
+std::vector<uint8_t> EncodePlotLine(uint8_t kind, const uint8_t* bytes, size_t count) {
+  RecordBuilder out;
+  const size_t fixed =
+      kind == kKindPlotLineV101 ? offsetof(PlotLineDescEx, name) : offsetof(PlotLineDescIm, name);
+  if (bytes == nullptr || count < fixed) return {};
+  const size_t room = count - fixed < kPlotNameMax ? count - fixed : kPlotNameMax;
+  const char* name = reinterpret_cast<const char*>(bytes + fixed);
+  const size_t n = strnlen(name, room);
+  if (kind == kKindPlotLineV101) {
+    PlotLineDescEx d;
+    std::memcpy(&d, bytes, fixed);
+    out.U16(d.stream_id).U16(d.flags).U16(d.sat_a).U16(d.sat_b).U16(d.index);
+  } else {
+    PlotLineDescIm d;
+    std::memcpy(&d, bytes, fixed);
+    out.U16(d.index).U8(d.value);
+  }
+  out.CountedString(std::string_view(name, n), kPlotNameMax);
+  return {out.data(), out.data() + out.size()};
+}
+
+}  // namespace
+
+uint32_t MessageType(uint32_t flags) {
+  static constexpr uint8_t kTypes[16] = {0, 3, 4, 5, 0, 1, 2, 1, 7, 6, 0, 0, 0, 0, 0, 0};
+  return kTypes[flags & 0xF];
+}
+
+bool TResultFile::Open() {
+  if (!file_.OpenWrite(path_, kModeWrite)) return false;
+  RecordBuilder header;
+  header.Bytes("$YRB", 4).U32(kResultFormatNumber).U16(0);
+  WriteRecord(kKindHeader, header.data(), header.size());
+  return true;
+}
+
+bool TResultFile::Close() {
+  if (!file_.is_open()) return false;
+  const bool end_written = WriteFramed(kKindEnd, nullptr, 0);
+  // The end record alone is not enough: bytes still waiting in the buffer may fail to reach
+  // the disk at the closing flush, and a result file that lost its tail must not be reported
+  // as complete.
+  const bool flushed = file_.Close();
+  return end_written && flushed;
+}
+
+bool TResultFile::is_open() const {
+  return file_.is_open();
+}
+bool TResultFile::good() const {
+  return file_.is_open() && file_.status() == 0;
+}
+
+bool TResultFile::WriteRecord(uint8_t kind, const void* bytes, size_t count) {
+  if (count > kMaxRecordPayload) return false;
+  const auto* payload = static_cast<const uint8_t*>(bytes);
+  if (kind == kKindPlotLineV100 || kind == kKindPlotLineV101) {
+    const std::vector<uint8_t> encoded = EncodePlotLine(kind, payload, count);
+    if (encoded.empty()) return false;
+    return WriteFramed(kind, encoded.data(), encoded.size());
+  }
+  if (payload == nullptr && count != 0) return false;
+  return WriteFramed(kind, payload, count);
+}
+
+bool TResultFile::WriteFramed(uint8_t kind, const uint8_t* payload, size_t count) {
+  const uint16_t length = static_cast<uint16_t>(count + kFrameBytes);
+  std::vector<uint8_t> frame(length);
+  frame[0] = kind;
+  le::Store<uint16_t>(&frame[1], length);
+  if (count != 0) std::memcpy(&frame[3], payload, count);
+  le::Store<uint16_t>(&frame[length - 2], length);
+  file_.Write(frame.data(), static_cast<uint32_t>(frame.size()));
+  return good();
+}
+
+bool TResultFile::WriteMessage(const char* text, uint32_t flags) {
+  if (flags & kMessageOpenLevel) ++nesting_depth;
+  if (flags & kMessageCloseLevel) --nesting_depth;
+  uint32_t type = MessageType(flags);
+  if (flags & kMessageOpenLevel) type += 0x20;
+  if (flags & kMessageCloseLevel) type += 0x40;
+  if (flags & kMessageMark400) type += 0x80;
+  RecordBuilder record;
+  record.U32(type).U32(static_cast<uint32_t>(nesting_depth));
+  record.CountedString(text != nullptr ? std::string_view(text) : std::string_view());
+  return WriteRecord(kKindMessage, record.data(), record.size());
+}
+
+size_t TResultFile::Append(const std::string& thread_file_path) {
+  auto file = platform::OpenFile(thread_file_path, platform::FileAccess::kRead,
+                                 platform::FileCreation::kOpenExisting);
+  if (!file) return 0;
+  auto view = platform::MapWholeFile(*file);
+  if (!view) return 0;
+  const uint8_t* data = view->data();
+  const size_t size = view->size();
+  size_t copied = 0;
+  size_t at = 0;
+  // Every length is checked against the bytes that remain: a thread file cut short by a
+  // crash or a full disk must end the copy, not carry the reader past the mapping.
+  while (size - at >= kFrameBytes) {
+    const uint8_t kind = data[at];
+    const uint16_t length = le::Load<uint16_t>(data + at + 1);
+    if (length < kFrameBytes || length > size - at) break;
+    if (le::Load<uint16_t>(data + at + length - 2) != length) break;
+    if (kind == kKindEnd) break;
+    if (kind != kKindHeader) {
+      file_.Write(data + at, length);
+      ++copied;
+    }
+    at += length;
+  }
+  return copied;
+}
+
+}  // namespace vox
