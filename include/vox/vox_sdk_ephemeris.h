@@ -288,4 +288,58 @@ VOX_END_DECLS
 
 /* ---- end of broadcast ephemerides ---- */
 
+/* ---- Precise ephemerides -----------------------------------------------------------------
+ *
+ * Tabulated satellite positions and clock offsets from the job's precise orbit files (SP3
+ * layout) and from the satellite position records of its raw files, one time-ordered list
+ * per satellite with at most one sample per whole second. A stream starts at the first
+ * sample whose window t - 900 to t + 900 (whole seconds, both ends inclusive) overlaps
+ * [*from, *to], and then runs to the end of the satellite's list.
+ *
+ * Streams take no locks: the store is complete before any engine runs and read-only after.
+ * A stream belongs to the engine between its open and close calls. */
+
+#pragma pack(push, 1)
+
+/* One sample (51 bytes). The satellite is the one the stream was opened for. */
+typedef struct VOX_PACKED vox_PreciseEphemerisData {
+  uint32_t seconds;     /* time, whole seconds since the GPS time origin */
+  uint16_t ms;          /* milliseconds */
+  double x;             /* position, metres */
+  double y;
+  double z;
+  uint8_t zero1[12];
+  float clock;          /* clock offset, seconds */
+  uint8_t zero2[5];
+} vox_PreciseEphemerisData;
+VOX_CHECK_SIZE(vox_PreciseEphemerisData, 51);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, seconds, 0);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, ms, 4);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, x, 6);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, y, 14);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, z, 22);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, zero1, 30);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, clock, 42);
+VOX_CHECK_OFFSET(vox_PreciseEphemerisData, zero2, 46);
+
+#pragma pack(pop)
+
+VOX_BEGIN_DECLS
+
+/* A stream over one satellite's samples (see above). Null when a pointer is null, the
+ * satellite is unknown, or no sample qualifies. */
+VOX_API void* VOX_CALL vox_OpenPreciseEphemerisStreamEx(SatId sat, const uint32_t* from,
+                                                        const uint32_t* to);
+/* The same with a short satellite number, mapped as for vox_OpenEphemerisStream. */
+VOX_API void* VOX_CALL vox_OpenPreciseEphemerisStream(uint8_t short_number, const uint32_t* from,
+                                                      const uint32_t* to);
+/* The next sample (right after open: the first qualifying one): 1, or 0 at the end. */
+VOX_API int32_t VOX_CALL vox_GetNextPreciseEphemeris(void* stream, vox_PreciseEphemerisData* out);
+/* Frees the stream; returns 1. */
+VOX_API int32_t VOX_CALL vox_ClosePreciseEphemerisStream(void* stream);
+
+VOX_END_DECLS
+
+/* ---- end of precise ephemerides ---- */
+
 #endif /* VOX_SDK_EPHEMERIS_H */

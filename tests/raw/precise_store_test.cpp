@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <cstring>
+#include <utility>
 #include <vector>
 
 namespace vox {
@@ -11,10 +12,12 @@ namespace {
 const SatId kG05 = MakeSatId(SatSystem::kGps, 5);
 const SatId kR01 = MakeSatId(SatSystem::kGlonass, 1);
 
-std::vector<TimeMs> Times(const PreciseStore& store, SatId sat) {
-  std::vector<TimeMs> times;
+using Time = std::pair<uint32_t, uint16_t>;
+
+std::vector<Time> Times(const PreciseStore& store, SatId sat) {
+  std::vector<Time> times;
   for (const PreciseSample* s = store.first(SatIndexOf(sat)); s != nullptr; s = s->next)
-    times.push_back(s->time);
+    times.emplace_back(s->time.seconds, s->time.ms);
   return times;
 }
 
@@ -42,11 +45,11 @@ TEST(PreciseStore, KeepsTimeOrderAndOneSamplePerSecond) {
   EXPECT_FALSE(store.Insert(kG05, {400, 100}, 9, 9, 9, 9));
   EXPECT_TRUE(store.Insert(kG05, {50, 0}, 1, 2, 3, 4));
 
-  const std::vector<TimeMs> expected = {{50, 0}, {100, 0}, {200, 250}, {300, 0}, {400, 500}};
+  const std::vector<Time> expected = {{50, 0}, {100, 0}, {200, 250}, {300, 0}, {400, 500}};
   EXPECT_EQ(Times(store, kG05), expected);
   EXPECT_EQ(store.count(SatIndexOf(kG05)), 5u);
-  EXPECT_EQ(store.first(SatIndexOf(kG05))->time, (TimeMs{50, 0}));
-  EXPECT_EQ(store.last(SatIndexOf(kG05))->time, (TimeMs{400, 500}));
+  EXPECT_TRUE(store.first(SatIndexOf(kG05))->time == (TimeMs{50, 0}));
+  EXPECT_TRUE(store.last(SatIndexOf(kG05))->time == (TimeMs{400, 500}));
   EXPECT_EQ(store.first(SatIndexOf(kG05))->next->x, 1.0);  // the first one stored won
 
   // Each satellite has its own list.

@@ -114,13 +114,13 @@ TEST_F(Sp3ReaderTest, ReadsPositionsAndSkipsUncountedLines) {
 
   const PreciseSample* g01 = store_.first(SatIndexOf(kG01));
   ASSERT_NE(g01, nullptr);
-  EXPECT_EQ(g01->time, kDay);
-  EXPECT_EQ(g01->x, 18392619.117);
-  EXPECT_EQ(g01->y, 7490690.408);
-  EXPECT_EQ(g01->z, -17846346.485);
+  EXPECT_TRUE(g01->time == kDay);
+  EXPECT_DOUBLE_EQ(g01->x, 18392619.117);
+  EXPECT_DOUBLE_EQ(g01->y, 7490690.408);
+  EXPECT_DOUBLE_EQ(g01->z, -17846346.485);
   EXPECT_EQ(g01->clock, static_cast<float>(12.5e-6));
   ASSERT_NE(g01->next, nullptr);
-  EXPECT_EQ(g01->next->time, (TimeMs{kDay.seconds + 930, 500}));
+  EXPECT_TRUE(g01->next->time == (TimeMs{kDay.seconds + 930, 500}));
   EXPECT_EQ(g01->next->x, 4000.0);
   EXPECT_EQ(store_.count(SatIndexOf(kG01)), 2u);
 
@@ -195,7 +195,7 @@ TEST(Sp3RealFiles, IgsFinalOrbits) {
   const uint32_t start = 1590 * 604800 + 345600;
   const PreciseSample* g01 = store.first(SatIndexOf(kG01));
   ASSERT_NE(g01, nullptr);
-  EXPECT_EQ(g01->time, (TimeMs{start, 0}));
+  EXPECT_TRUE(g01->time == (TimeMs{start, 0}));
   // "PG01  18392.619117   7490.690408 -17846.346485 999999.999999"
   EXPECT_DOUBLE_EQ(g01->x, 18392619.117);
   EXPECT_DOUBLE_EQ(g01->y, 7490690.408);
@@ -207,7 +207,7 @@ TEST(Sp3RealFiles, IgsFinalOrbits) {
   EXPECT_FLOAT_EQ(g02->clock, 269.108429e-6f);
   // Last epoch 23:45: "PG32  24669.573362  -7422.063705  -5325.411899    -28.330453"
   const PreciseSample* g32 = store.last(SatIndexOf(MakeSatId(SatSystem::kGps, 32)));
-  EXPECT_EQ(g32->time, (TimeMs{start + 85500, 0}));
+  EXPECT_TRUE(g32->time == (TimeMs{start + 85500, 0}));
   EXPECT_DOUBLE_EQ(g32->y, -7422063.705);
   EXPECT_DOUBLE_EQ(g32->z, -5325411.899);
   EXPECT_FLOAT_EQ(g32->clock, -28.330453e-6f);
@@ -222,7 +222,7 @@ TEST(Sp3RealFiles, IgsFinalOrbits) {
     for (const PreciseSample *a = store.first(i), *b = again.first(i); a || b;
          a = a->next, b = b->next) {
       ASSERT_TRUE(a && b);
-      ASSERT_EQ(a->time, b->time);
+      ASSERT_TRUE(a->time == b->time);
       ASSERT_EQ(a->x, b->x);
       ASSERT_EQ(a->clock, b->clock);
     }
