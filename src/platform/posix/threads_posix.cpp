@@ -22,13 +22,15 @@ namespace {
 constexpr uint32_t kStillActive = 259;
 constexpr uint32_t kNoLimit = UINT32_MAX;
 
+// Never destroyed: a thread still running at process exit may signal its end after the
+// static destructors have run.
 std::mutex& EndMutex() {
-  static std::mutex mutex;
-  return mutex;
+  static auto* mutex = new std::mutex;
+  return *mutex;
 }
 std::condition_variable& EndSignal() {
-  static std::condition_variable signal;
-  return signal;
+  static auto* signal = new std::condition_variable;
+  return *signal;
 }
 
 // Shared by the Thread object and the running thread; the last of the two frees it.
