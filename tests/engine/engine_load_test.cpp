@@ -137,18 +137,5 @@ TEST_F(EngineLoad, FolderPartDecidesWhichFileOfTheNameIsLoaded) {
   EXPECT_TRUE(relative->mapped()) << "the obsolete copy was the one mapped";
 }
 
-TEST_F(EngineLoad, LoadIntoHolderReplacesThePreviousEngineFirst) {
-  std::unique_ptr<TEngine> holder;
-  EXPECT_TRUE(LoadEngineInto(holder, EngineFile("test_v21.eng")));
-  EXPECT_FALSE(holder->loaded());
-  EXPECT_TRUE(LoadEngineInto(holder, EngineFile("test_bare.dll")));
-  EXPECT_TRUE(holder->loaded());
-  holder.reset();
-  const std::string v21 = EngineFile("test_v21.eng");
-  const std::string bare = EngineFile("test_bare.dll");
-  EXPECT_THAT(LogLines(), ElementsAre("EXCEPTION: " + v21 + ": OBSOLETE", v21 + ": OBSOLETE",
-                                      v21 + ": unload", bare + ": load", bare + ": unload"));
-}
-
 }  // namespace
 }  // namespace vox
