@@ -211,22 +211,6 @@ TEST(Sp3RealFiles, IgsFinalOrbits) {
   EXPECT_DOUBLE_EQ(g32->y, -7422063.705);
   EXPECT_DOUBLE_EQ(g32->z, -5325411.899);
   EXPECT_FLOAT_EQ(g32->clock, -28.330453e-6f);
-
-  // Buffered reading gives the same samples as the mapped view.
-  TBufFile buffered;
-  buffered.set_mapping_allowed(false);
-  ASSERT_TRUE(buffered.OpenRead(DataFile("igs15904.sp3")));
-  PreciseStore again;
-  EXPECT_EQ(ReadPreciseOrbitFile(buffered, again), kPreciseFileComplete);
-  for (unsigned i = 0; i < 32; ++i) {
-    for (const PreciseSample *a = store.first(i), *b = again.first(i); a || b;
-         a = a->next, b = b->next) {
-      ASSERT_TRUE(a && b);
-      ASSERT_TRUE(a->time == b->time);
-      ASSERT_EQ(a->x, b->x);
-      ASSERT_EQ(a->clock, b->clock);
-    }
-  }
 }
 
 TEST(Sp3RealFiles, HeaderPaddedTo80ColumnsIsNotTaken) {
