@@ -6,7 +6,6 @@
 
 #include "base/scratch_ring.h"
 #include "base/short_text.h"
-#include "base/xmsg.h"
 #include "platform/platform.h"
 
 namespace vox {
@@ -95,14 +94,6 @@ TEST(ShortText, SystemErrorTexts) {
   EXPECT_EQ(std::string(text), expected.substr(0, 255));
   platform::SetLastSystemError(2);
   EXPECT_EQ(LastErrorString(), expected.substr(0, 255));
-}
-
-TEST(Xmsg, CarriesItsText) {
-  try {
-    throw xmsg("engine table incomplete");
-  } catch (const std::exception& e) {
-    EXPECT_STREQ(e.what(), "engine table incomplete");
-  }
 }
 
 }  // namespace
