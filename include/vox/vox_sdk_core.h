@@ -44,4 +44,19 @@ VOX_CHECK_OFFSET(vox_ThreadContext, progress, 20);
 VOX_CHECK_OFFSET(vox_ThreadContext, message, 28);
 VOX_CHECK_OFFSET(vox_ThreadContext, id, 36);
 
+VOX_BEGIN_DECLS
+
+/* Thread functions. An engine thread that writes results registers itself before its first
+ * result with vox_InitNewThread, passing its own copy of the context it was given: the copy
+ * then carries a result writer of the thread's own (bit 6 set in flags), and the calling
+ * thread's floating-point mode is set for engine code. Returns 1.
+ * vox_DeleteThread releases it when the thread's work is done: the thread's records reach
+ * the result file as one block, and the thread counts as 100 percent done. Returns 0.
+ * vox_GetThreadCount: the job's "NumCPUs" (1 to 32). All three are for engine calls only. */
+VOX_API uint32_t vox_InitNewThread(vox_ThreadContext* context);
+VOX_API uint32_t vox_DeleteThread(vox_ThreadContext* context);
+VOX_API uint32_t vox_GetThreadCount(void);
+
+VOX_END_DECLS
+
 #endif /* VOX_SDK_CORE_H */
