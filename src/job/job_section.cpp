@@ -119,6 +119,16 @@ double ParseDouble(std::string_view text, size_t* consumed) {
   const char* first = text.data() + pos;
   const char* last = text.data() + text.size();
 
+  // Hexadecimal numbers ("0x1.8p1") as the C conversion reads them.
+  if (last - first > 2 && first[0] == '0' && (first[1] == 'x' || first[1] == 'X')) {
+    double hex = 0.0;
+    const auto result = std::from_chars(first + 2, last, hex, std::chars_format::hex);
+    if (result.ec == std::errc() && first[2] != '-' && first[2] != '+') {
+      if (consumed != nullptr) *consumed = static_cast<size_t>(result.ptr - text.data());
+      return negative ? -hex : hex;
+    }
+  }
+
   double value = 0.0;
   const auto result = std::from_chars(first, last, value, std::chars_format::general);
   if (result.ec == std::errc::result_out_of_range) {

@@ -105,6 +105,8 @@ TEST(JobSection, DoubleLimits) {
   EXPECT_EQ(ParseDouble("-1e99999"), -std::numeric_limits<double>::infinity());
   EXPECT_EQ(ParseDouble("1e-99999"), 0.0);
   EXPECT_EQ(ParseDouble("--1"), 0.0);
+  EXPECT_EQ(ParseDouble("-0x1.8p1"), -3.0);
+  EXPECT_EQ(ParseDouble("0x"), 0.0);
   // Only the first 63 bytes count.
   EXPECT_EQ(ParseDouble(std::string(62, '0') + "12"), 1.0);
 }
