@@ -43,8 +43,8 @@ struct JobModel {
   SatId omit_list[kSatIndexCount] = {};
   JobWindow window;
 
-  // Referring lists first, so that they are destroyed before what they refer to (the
-  // references are never followed on destruction, but keeping the order costs nothing).
+  // Items refer to each other by plain pointers that are never followed on destruction,
+  // so the lists may be destroyed in any order.
   ItemList<TVectorItem> vectors;
   ItemList<TFanItem> fans;
   ItemList<TOccupItem> occupations;
