@@ -11,6 +11,7 @@
 #include "vox_sdk_engine.h"
 #include "vox_sdk_leap.h"
 #include "vox_sdk_ephemeris.h"
+#include "vox_sdk_meteo.h"
 #include "vox_sdk_results.h"
 
 #endif /* VOX_ENGINE_H */
