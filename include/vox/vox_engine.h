@@ -13,6 +13,7 @@
 #include "vox_sdk_ephemeris.h"
 #include "vox_sdk_meteo.h"
 #include "vox_sdk_results.h"
+#include "vox_sdk_streams.h"
 #include "vox_sdk_fields.h"
 
 #endif /* VOX_ENGINE_H */
