@@ -34,7 +34,7 @@ uint32_t RegisterCallback(uintptr_t argument) {
   RegisterHostCallback(pair->fn, pair->context);
   // The caller's own function is told at once when the job has already ended, whether or
   // not it became the registered one.
-  const uint32_t exit_code = Run().exit_code.load();
+  const uint32_t exit_code = TheRun().exit_code.load();
   if (pair->fn != nullptr && exit_code != kExitStillActive)
     pair->fn(pair->context, kCallbackExitCode, exit_code);
   return kCommandCallback;
@@ -47,7 +47,7 @@ uint64_t OpenControlWindow() {
   std::lock_guard lock(c.mutex);
   c.open = ++c.last_generation;
   c.title = kInitialWindowTitle;
-  Run().pause_flag.store(0);
+  TheRun().pause_flag.store(0);
   return c.open;
 }
 
@@ -59,7 +59,7 @@ void CloseControlWindow(uint64_t handle) {
   c.title.clear();
   // Nothing waits on a pause here, but a pause left standing would outlive the window that
   // could have lifted it; drop it with the window.
-  Run().pause_flag.store(0);
+  TheRun().pause_flag.store(0);
 }
 
 bool ControlWindowIsOpen(uint64_t handle) {
@@ -107,7 +107,7 @@ uint32_t SendControlCommand(uint64_t handle, uint32_t command, uintptr_t argumen
   // callback it registers is told the exit code at once.
   if (command == kCommandCallback && IsLatestWindow(handle)) return RegisterCallback(argument);
   if (!ControlWindowIsOpen(handle)) return 0;
-  RunState& run = Run();
+  RunState& run = TheRun();
   switch (command) {
     case kCommandBreak:
       run.break_flag.store(1);

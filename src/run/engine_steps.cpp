@@ -29,7 +29,7 @@ bool RunEngineStep(TTask& task) {
 }
 
 void BreakCheck(TTask& task) {
-  if (Run().break_flag.load() != 1) return;
+  if (TheRun().break_flag.load() != 1) return;
   TEngine* engine = task.current_engine;
   if (engine != nullptr && engine->loaded()) engine->BreakProcess();
 }

@@ -62,15 +62,15 @@ uint32_t RunTask(TTask& task, TRunContext& context) {
   }
   SetControlWindowTitle(context.window, task.job.job_name);
 
-  if (RunRawFilterStep(task) && Run().break_flag.load() == 0 && !task.job.raw_filter_only)
+  if (RunRawFilterStep(task) && TheRun().break_flag.load() == 0 && !task.job.raw_filter_only)
     RunEngineStep(task);
   // The engine steps unmask floating-point traps on this thread; the host callback that
   // follows on this thread must not inherit them.
   platform::RestoreDefaultFloatingPointMode();
 
   const bool closed = task.result_file.Close();
-  Run().progress.store(99);
-  if (Run().break_flag.load() != 0) return kExitBreak;
+  TheRun().progress.store(99);
+  if (TheRun().break_flag.load() != 0) return kExitBreak;
   return closed ? kExitDone : kExitCloseFailed;
 }
 
@@ -105,7 +105,7 @@ uint32_t RunPipeline(TRunContext* context) {
   StoreJobStart(LocalGpsWeekTime());
   auto task = std::make_unique<TTask>();
   task->job.thread_count = context->cpu_count;
-  Run().current_task.store(task.get(), std::memory_order_release);
+  TheRun().current_task.store(task.get(), std::memory_order_release);
 
   const uint32_t exit_code = RunTask(*task, *context);
 
@@ -113,7 +113,7 @@ uint32_t RunPipeline(TRunContext* context) {
   // The end time is taken before the task goes, so that command 5 never pairs this job's
   // start with the previous job's end.
   StoreJobEnd(LocalGpsWeekTime());
-  Run().current_task.store(nullptr, std::memory_order_release);
+  TheRun().current_task.store(nullptr, std::memory_order_release);
   task.reset();
   CloseEngineLog();
 

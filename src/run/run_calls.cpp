@@ -18,7 +18,7 @@ namespace {
 constexpr size_t kJobThreadStack = 0x100000;
 
 uint32_t ThreadEpilogue(uint32_t exit_code) {
-  RunState& run = Run();
+  RunState& run = TheRun();
   run.exit_code.store(exit_code);
   run.run_in_flight.store(false);
   NotifyHost(kCallbackExitCode, exit_code);
@@ -36,7 +36,7 @@ uint32_t TextJobThread(void* context) {
 // Prologue steps up to the window; false when refused as busy.
 bool ClaimRun() {
   bool expected = false;
-  if (!Run().run_in_flight.compare_exchange_strong(expected, true)) {
+  if (!TheRun().run_in_flight.compare_exchange_strong(expected, true)) {
     WriteOwnEngineLog("Program is busy\n");
     return false;
   }
@@ -53,7 +53,7 @@ struct Started {
 Started StartJob(TRunContext* context, platform::ThreadProc proc) {
   Started started;
   started.window = OpenControlWindow();
-  RunState& run = Run();
+  RunState& run = TheRun();
   run.job_thread_id.store(0);
   run.break_flag.store(0);
   run.progress.store(0);

@@ -32,13 +32,13 @@ int64_t PackedMs(uint64_t packed) {
 
 }  // namespace
 
-RunState& Run() {
+RunState& TheRun() {
   static RunState state;
   return state;
 }
 
 TTask* CurrentTask() {
-  return Run().current_task.load(std::memory_order_acquire);
+  return TheRun().current_task.load(std::memory_order_acquire);
 }
 
 bool RegisterHostCallback(HostCallbackFn fn, void* context) {
@@ -55,9 +55,9 @@ void NotifyHost(uint32_t code, uint32_t value) {
 }
 
 void RaiseProgress(uint32_t percent) {
-  uint32_t current = Run().progress.load();
+  uint32_t current = TheRun().progress.load();
   while (percent > current) {
-    if (Run().progress.compare_exchange_weak(current, percent)) {
+    if (TheRun().progress.compare_exchange_weak(current, percent)) {
       NotifyHost(kCallbackProgress, percent);
       return;
     }
@@ -65,15 +65,16 @@ void RaiseProgress(uint32_t percent) {
 }
 
 void StoreJobStart(const GpsWeekTime& t) {
-  Run().job_start.store(Pack(t));
+  TheRun().job_start.store(Pack(t));
 }
 void StoreJobEnd(const GpsWeekTime& t) {
-  Run().job_end.store(Pack(t));
+  TheRun().job_end.store(Pack(t));
 }
 
 uint32_t ElapsedSeconds() {
-  const uint64_t start = Run().job_start.load();
-  const uint64_t end = CurrentTask() != nullptr ? Pack(LocalGpsWeekTime()) : Run().job_end.load();
+  const uint64_t start = TheRun().job_start.load();
+  const uint64_t end =
+      CurrentTask() != nullptr ? Pack(LocalGpsWeekTime()) : TheRun().job_end.load();
   const int64_t ms = PackedMs(end) - PackedMs(start);
   // The local clock may be set back during a job; a negative span reads as 0.
   return ms <= 0 ? 0 : static_cast<uint32_t>(ms / 1000);

@@ -52,7 +52,7 @@ struct RunState {
   std::atomic<uint64_t> job_end{0};
 };
 
-RunState& Run();
+RunState& TheRun();
 
 // Registers the host callback unless one is registered already; true when registered now.
 bool RegisterHostCallback(HostCallbackFn fn, void* context);
