@@ -11,8 +11,10 @@
 #include "vox_sdk_engine.h"
 #include "vox_sdk_leap.h"
 #include "vox_sdk_ephemeris.h"
+#include "vox_sdk_epoch.h"
 #include "vox_sdk_meteo.h"
 #include "vox_sdk_results.h"
+#include "vox_sdk_inert.h"
 #include "vox_sdk_streams.h"
 #include "vox_sdk_fields.h"
 

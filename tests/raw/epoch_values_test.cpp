@@ -1,0 +1,233 @@
+// Code values on one time scale, the GPS L2C rules, leap seconds and the NMEA output of the
+// epoch stream, in both byte orders.
+#include <gtest/gtest.h>
+
+#include <filesystem>
+#include <fstream>
+#include <sstream>
+
+#include "epoch_test_files.h"
+#include "job/leap_seconds.h"
+#include "vox/vox_sdk_epoch.h"
+
+namespace vox::test {
+namespace {
+
+class EpochValuesTest : public ::testing::TestWithParam<RawOrder> {};
+
+struct ScaleCase {
+  uint8_t tag;
+  char system;
+  unsigned number;
+  const char* time_system;
+  double offset;  // added to pseudorange / c; L = 17
+};
+
+TEST_P(EpochValuesTest, CodeValuesComeOnOneTimeScale) {
+  const double L = 17.0;
+  const ScaleCase cases[] = {
+      {51, 'G', 3, "GPS", 0.0},      {51, 'G', 3, "UTC", -L},   {51, 'E', 3, "GPS", 0.0},
+      {51, 'E', 3, "UTC", -L},       {51, 'S', 33, "GPS", 0.0}, {51, 'S', 33, "UTC", -L},
+      {51, 'R', 3, "GPS", +L},       {51, 'R', 3, "UTC", 0.0},  {51, 'C', 3, "GPS", 14.0},
+      {51, 'C', 3, "UTC", 14.0 - L}, {8, 'G', 3, "GPS", 0.0},   {8, 'G', 3, "UTC", -L},
+      {8, 'R', 3, "GPS", +L},        {8, 'R', 3, "UTC", 0.0},   {8, 'S', 33, "GPS", +L},
+      {8, 'S', 33, "UTC", 0.0},
+  };
+  for (const ScaleCase& c : cases) {
+    const double pr = 2.0e7 + 0.123;
+    ScannedFile f(BuildFile(GetParam(), {{1000, {Sat(c.tag, c.system, c.number, {{0, pr, {}}})}}},
+                            c.time_system, {}, c.tag));
+    auto s = f.Open();
+    ASSERT_TRUE(s);
+    EXPECT_EQ(s->time_reference().leap_seconds, 17u);
+    const auto d = FirstSatellite(*s);
+    ASSERT_TRUE(d) << c.system << int(c.tag) << c.time_system;
+    const double expected = c.offset == 14.0 - L ? pr / kC + (14.0 - L) : pr / kC + c.offset;
+    EXPECT_EQ(d->values[0], expected) << c.system << int(c.tag) << c.time_system;
+  }
+}
+
+TEST_P(EpochValuesTest, LeapSecondsOfTheRecordAreReportedToTheTable) {
+  // A day in March 2020, which the built-in table does not cover.
+  const uint32_t day = 14670;
+  const TimeMs t{day * 86400 + 3600, 0};
+  RawWriter w(GetParam());
+  w.Header().TimeRef("UTC", {0, day}, 5u, 18u);
+  w.Epoch(51, 1000, {Sat(51, 'G', 3, {{0, 2.0e7, {}}})}).EndOfData();
+  ScannedFile f(w);
+  auto s = f.Open();
+  ASSERT_TRUE(s);
+  EXPECT_EQ(s->time_reference().leap_seconds, 18u);
+  EXPECT_FALSE(s->time_reference().gps);
+  EXPECT_EQ(GetLeapSeconds(t), 18u);
+  EXPECT_EQ(FirstSatellite(*s)->values[0], 2.0e7 / kC - 18.0);
+}
+
+TEST_P(EpochValuesTest, UncoveredTimeWithoutLeapSecondsCountsZero) {
+  const uint32_t day = 40000;  // 2089
+  RawWriter w(GetParam());
+  w.Header().TimeRef("UTC", {0, day});
+  w.Epoch(51, 1000, {Sat(51, 'G', 3, {{0, 2.0e7, {}}})}).EndOfData();
+  ScannedFile f(w);
+  auto s = f.Open();
+  ASSERT_TRUE(s);
+  EXPECT_EQ(s->time_reference().leap_seconds, 0u);
+}
+
+// GPS 5 with L2C and L2P code and phase; the scan's own decisions are replaced by the test's.
+class L2cRules {
+ public:
+  explicit L2cRules(RawOrder order)
+      : f_(BuildFile(order, {{1000, {Sat(51, 'G', 5, {{2, 2.1e7, 1.1e8}, {3, 2.2e7, 1.2e8}})}}})) {}
+  vox_EpochSatData Read(bool usable, bool agreeing) {
+    f_.ClearRules();
+    f_.file.c2_l2_offset = 0.25;
+    if (usable) f_.file.c2_usable_mask = 1u << 4;
+    if (agreeing) f_.file.c2_agreeing_mask = 1u << 4;
+    auto s = f_.Open();
+    return *FirstSatellite(*s, -1.0);
+  }
+
+ private:
+  ScannedFile f_;
+};
+
+constexpr int kL2cCode = 4, kL2cPhase = 5, kL2pCode = 6, kL2pPhase = 7;
+
+TEST_P(EpochValuesTest, L2cInBothMasksIsCorrectedByTheOffset) {
+  L2cRules r(GetParam());
+  const auto d = r.Read(true, true);
+  EXPECT_EQ(d.presence, 0xF0u);
+  EXPECT_EQ(d.values[kL2cPhase], 1.1e8 - 0.25);
+  EXPECT_EQ(d.values[kL2cCode], 2.1e7 / kC);
+}
+
+TEST_P(EpochValuesTest, L2cUsableOnlyTakesTheL2pPhase) {
+  L2cRules r(GetParam());
+  const auto d = r.Read(true, false);
+  EXPECT_EQ(d.presence, 0xF0u);
+  EXPECT_EQ(d.values[kL2cPhase], 1.2e8);
+  EXPECT_EQ(d.values[kL2cCode], 2.1e7 / kC) << "the L2C code stays";
+}
+
+TEST_P(EpochValuesTest, L2cInNeitherMaskTakesL2pCodeAndPhase) {
+  L2cRules r(GetParam());
+  const auto d = r.Read(false, false);
+  EXPECT_EQ(d.presence, 0xF0u);
+  EXPECT_EQ(d.values[kL2cCode], 2.2e7 / kC);
+  EXPECT_EQ(d.values[kL2cPhase], 1.2e8);
+  EXPECT_EQ(d.values[kL2pCode], 2.2e7 / kC);
+}
+
+TEST_P(EpochValuesTest, L2cUsableOnlyWithoutL2pLosesItsPhase) {
+  ScannedFile f(BuildFile(GetParam(), {{1000, {Sat(51, 'G', 5, {{2, 2.1e7, 1.1e8}})}}}));
+  f.ClearRules();
+  f.file.c2_usable_mask = 1u << 4;
+  auto s = f.Open();
+  const auto d = FirstSatellite(*s, -1.0);
+  EXPECT_EQ(d->presence, 1u << kL2cCode);
+  EXPECT_EQ(d->values[kL2cPhase], -1.0);
+}
+
+std::string ReadText(const std::string& path) {
+  std::ifstream in(path, std::ios::binary);
+  std::stringstream s;
+  s << in.rdbuf();
+  return s.str();
+}
+
+size_t Count(const std::string& text, const std::string& what) {
+  size_t n = 0;
+  for (size_t p = text.find(what); p != std::string::npos; p = text.find(what, p + 1))
+    ++n;
+  return n;
+}
+
+TEST_P(EpochValuesTest, FirstSolutionCreatesTheNmeaFileAndLaterOnesAppend) {
+  ScannedFile f(BuildFile(GetParam(), Seconds(51, 10, 13)));
+  const std::string path = (std::filesystem::temp_directory_path() /
+                            ("vox_epoch_nmea_" + std::to_string(::getpid()) + ".txt"))
+                               .string();
+  {
+    std::ofstream old(path);
+    old << "left over from an earlier run\n";
+  }
+  f.occupation.nmea_path = path;
+  vox_NavSolutionData sol{};
+  sol.seconds = At(10).seconds;
+  sol.ms = 0;
+  sol.x = 4000000.0, sol.y = 1000000.0, sol.z = 4800000.0;
+  sol.sat_count = 7;
+  sol.hdop = 1.25;
+  for (int pass = 0; pass < 2; ++pass) {
+    void* s = f.Open().release();
+    ASSERT_NE(s, nullptr);
+    EXPECT_EQ(vox_SetEpochNavSolutionEx(s, &sol), 0);
+    EXPECT_EQ(vox_SetEpochNavSolutionEx(s, &sol), 0);
+    EXPECT_EQ(vox_CloseEpochStream(s), 1);
+    const std::string text = ReadText(path);
+    EXPECT_EQ(text.find("left over"), std::string::npos);
+    EXPECT_EQ(Count(text, "$GPZDA"), 1u) << "each stream starts a fresh file";
+    EXPECT_EQ(Count(text, "$GPGGA"), 2u);
+    EXPECT_NE(text.find(",1,07,1.2,"), std::string::npos) << "quality 1, satellites, HDOP";
+  }
+  std::filesystem::remove(path);
+}
+
+TEST_P(EpochValuesTest, NoNmeaPathOrAFailedOutputDropsSolutions) {
+  ScannedFile f(BuildFile(GetParam(), Seconds(51, 10, 13)));
+  vox_NavSolutionData sol{};
+  void* s = f.Open().release();
+  EXPECT_EQ(vox_SetEpochNavSolutionEx(s, &sol), 0);
+  EXPECT_EQ(static_cast<EpochStream*>(s)->NavOutput(0x2), nullptr);
+  vox_CloseEpochStream(s);
+  f.occupation.nmea_path = "/nonexistent-folder/for/sure/out.nmea";
+  s = f.Open().release();
+  EXPECT_EQ(vox_SetEpochNavSolutionEx(s, &sol), 0);
+  EXPECT_EQ(static_cast<EpochStream*>(s)->NavOutput(0x2), nullptr);
+  vox_CloseEpochStream(s);
+}
+
+TEST_P(EpochValuesTest, NullArgumentsAndBrokenFilesGiveNothing) {
+  EXPECT_EQ(vox_FindEpoch(nullptr, nullptr, nullptr), 0);
+  EXPECT_EQ(vox_GetNextEpoch(nullptr, nullptr), 0);
+  EXPECT_EQ(vox_GetEpochDataEx(nullptr, nullptr), 0);
+  EXPECT_EQ(vox_SetEpochNavSolutionEx(nullptr, nullptr), 0);
+  EXPECT_EQ(vox_CloseEpochStream(nullptr), 1);
+
+  ScannedFile f(BuildFile(GetParam(), Seconds(51, 10, 13)));
+  void* s = f.Open().release();
+  EXPECT_EQ(vox_FindEpoch(s, nullptr, nullptr), 0);
+  vox_CloseEpochStream(s);
+
+  f.occupation.time_ref_position = f.occupation.first_epoch_position;  // not a time reference
+  EXPECT_FALSE(f.Open());
+
+  TOccupItem lonely(9);
+  EXPECT_FALSE(EpochStream::Open(lonely, 0, nullptr, nullptr));
+  TOccupItem empty(8);
+  TChainItem file(8, "/nonexistent", false, false);
+  empty.SetFile(&file);
+  EXPECT_FALSE(EpochStream::Open(empty, 0, nullptr, nullptr)) << "no epochs";
+}
+
+TEST_P(EpochValuesTest, TruncatedFileEndsTheStream) {
+  RawWriter w = BuildFile(GetParam(), Seconds(51, 10, 14));
+  ScannedFile whole(w);
+  std::vector<uint8_t> bytes = w.bytes();
+  bytes.resize(bytes.size() - 20);  // cut into the last epoch
+  TempRawFile cut(bytes);
+  whole.file.path = cut.path();
+  auto s = whole.Open();
+  ASSERT_TRUE(s);
+  EXPECT_EQ(Delivered(*s).size(), 3u);
+}
+
+INSTANTIATE_TEST_SUITE_P(Orders, EpochValuesTest,
+                         ::testing::Values(RawOrder::kLittle, RawOrder::kBig),
+                         [](const auto& info) {
+                           return std::string(info.param == RawOrder::kBig ? "Big" : "Little");
+                         });
+
+}  // namespace
+}  // namespace vox::test
