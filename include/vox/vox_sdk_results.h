@@ -31,45 +31,45 @@ typedef struct vox_PlotStream vox_PlotStream;
 /* Input of vox_SetVectorResult (124 bytes). The values marked "stored" are kept in the
  * result record as received. */
 typedef struct VOX_PACKED vox_VectorResult {
-  uint32_t solved;          /* nonzero: the record carries a solution */
-  uint32_t reversed;        /* nonzero: the solution runs from the second point to the first */
-  double base[3];           /* base position X, Y, Z, metres */
+  uint32_t solved;   /* nonzero: the record carries a solution */
+  uint32_t reversed; /* nonzero: the solution runs from the second point to the first */
+  double base[3];    /* base position X, Y, Z, metres */
   float base_rms;
-  double baseline[3];       /* dX, dY, dZ, metres */
+  double baseline[3]; /* dX, dY, dZ, metres */
   float baseline_rms;
   uint32_t solution_flags;
-  uint32_t stored_a[4];     /* stored */
-  float stored_b;           /* stored */
-  float stored_c;           /* stored */
-  uint32_t stored_d[4];     /* stored */
-  float stored_e;           /* stored */
-  float stored_f;           /* stored */
-  uint32_t reserved;        /* not read */
-  float extra;              /* stored only when solution_flags carry 0x1000 */
+  uint32_t stored_a[4]; /* stored */
+  float stored_b;       /* stored */
+  float stored_c;       /* stored */
+  uint32_t stored_d[4]; /* stored */
+  float stored_e;       /* stored */
+  float stored_f;       /* stored */
+  uint32_t reserved;    /* not read */
+  float extra;          /* stored only when solution_flags carry 0x1000 */
 } vox_VectorResult;
 
 /* Input of vox_SetFanResult (28 bytes). */
 typedef struct VOX_PACKED vox_FanResult {
-  uint32_t has_position;    /* nonzero: position holds the fan's solved position */
-  double position[3];       /* X, Y, Z, metres */
+  uint32_t has_position; /* nonzero: position holds the fan's solved position */
+  double position[3];    /* X, Y, Z, metres */
 } vox_FanResult;
 
 /* Input of vox_SetNextRay (54 bytes): one kinematic position of a fan. */
 typedef struct VOX_PACKED vox_RayData {
-  TimeMs time;              /* GPS time */
-  double position[3];       /* X, Y, Z, metres (Earth-centred) */
-  uint32_t values[3];       /* stored */
-  uint32_t flags;           /* bits 0-1 fix kind, 3, 10, 13-29 quality marks (see below) */
+  TimeMs time;        /* GPS time */
+  double position[3]; /* X, Y, Z, metres (Earth-centred) */
+  uint32_t values[3]; /* stored */
+  uint32_t flags;     /* bits 0-1 fix kind, 3, 10, 13-29 quality marks (see below) */
   float hdop;
   uint32_t satellites;
 } vox_RayData;
 
 /* vox_CopyData kinds 5 and 10 (at least 56 bytes): per-satellite record with two times. */
 typedef struct VOX_PACKED vox_CopySatellite {
-  uint8_t reserved[16];     /* not read */
+  uint8_t reserved[16]; /* not read */
   uint16_t obs_flags;
-  uint8_t sat_a;            /* satellite index (0 to 148) */
-  uint8_t sat_b;            /* second satellite index, 0 when there is none */
+  uint8_t sat_a; /* satellite index (0 to 148) */
+  uint8_t sat_b; /* second satellite index, 0 when there is none */
   TimeMs time1;
   TimeMs time2;
   uint32_t value;
@@ -79,7 +79,7 @@ typedef struct VOX_PACKED vox_CopySatellite {
 
 /* vox_CopyData kinds 8 and 11 (at least 32 bytes). */
 typedef struct VOX_PACKED vox_CopySatelliteShort {
-  uint8_t reserved[16];     /* not read */
+  uint8_t reserved[16]; /* not read */
   uint16_t obs_flags;
   uint8_t sat_a;
   uint8_t sat_b;
@@ -94,19 +94,19 @@ typedef struct VOX_PACKED vox_CopySolution {
 
 /* vox_CopyData kind 6 (at least 168 bytes): the processing span of a vector. */
 typedef struct VOX_PACKED vox_CopyVectorSpan {
-  uint8_t reserved[124];    /* not read */
-  uint32_t vector_id;       /* section number or full identifier */
+  uint8_t reserved[124]; /* not read */
+  uint32_t vector_id;    /* section number or full identifier */
   TimeMs start;
   TimeMs end;
   uint32_t value1;
   uint32_t value2;
-  float value;              /* 0 or more: the span is set */
-  char name[16];            /* zero-terminated; at most 15 characters are stored */
+  float value;   /* 0 or more: the span is set */
+  char name[16]; /* zero-terminated; at most 15 characters are stored */
 } vox_CopyVectorSpan;
 
 /* vox_CopyData kind 7 (at least 76 bytes): the processing span of a fan. */
 typedef struct VOX_PACKED vox_CopyFanSpan {
-  uint8_t reserved[32];     /* not read */
+  uint8_t reserved[32]; /* not read */
   uint32_t fan_id;
   TimeMs start;
   TimeMs end;
@@ -119,10 +119,10 @@ typedef struct VOX_PACKED vox_CopyFanSpan {
 /* The record of vox_CopyData: one layout per data kind, all at the same address. */
 typedef union vox_CopyDataRec {
   uint8_t bytes[168];
-  vox_CopySolution solution;           /* kind 1 */
-  vox_CopySatellite satellite;         /* kinds 5 and 10 */
-  vox_CopyVectorSpan vector_span;      /* kind 6 */
-  vox_CopyFanSpan fan_span;            /* kind 7 */
+  vox_CopySolution solution;              /* kind 1 */
+  vox_CopySatellite satellite;            /* kinds 5 and 10 */
+  vox_CopyVectorSpan vector_span;         /* kind 6 */
+  vox_CopyFanSpan fan_span;               /* kind 7 */
   vox_CopySatelliteShort satellite_short; /* kinds 8 and 11 */
 } vox_CopyDataRec;
 
@@ -208,14 +208,14 @@ VOX_CHECK_OFFSET(vox_CopyDataRec, fan_span, 0);
 VOX_CHECK_OFFSET(vox_CopyDataRec, satellite_short, 0);
 
 /* Data kinds of vox_CopyData. */
-#define VOX_COPY_SOLUTION_START 1  /* vox_CopySolution; clears the writer's plot counter */
-#define VOX_COPY_SATELLITE_B 5     /* vox_CopySatellite, one-byte satellite codes */
-#define VOX_COPY_VECTOR_SPAN 6     /* vox_CopyVectorSpan */
-#define VOX_COPY_FAN_SPAN 7        /* vox_CopyFanSpan */
-#define VOX_COPY_SATELLITE_A 8     /* vox_CopySatelliteShort, one-byte satellite codes */
-#define VOX_COPY_PLOT_COUNTER 9    /* raises the writer's plot counter; returns 0 */
-#define VOX_COPY_SATELLITE_C 10    /* vox_CopySatellite, two-byte satellite codes */
-#define VOX_COPY_SATELLITE_D 11    /* vox_CopySatelliteShort, two-byte satellite codes */
+#define VOX_COPY_SOLUTION_START 1 /* vox_CopySolution; clears the writer's plot counter */
+#define VOX_COPY_SATELLITE_B 5    /* vox_CopySatellite, one-byte satellite codes */
+#define VOX_COPY_VECTOR_SPAN 6    /* vox_CopyVectorSpan */
+#define VOX_COPY_FAN_SPAN 7       /* vox_CopyFanSpan */
+#define VOX_COPY_SATELLITE_A 8    /* vox_CopySatelliteShort, one-byte satellite codes */
+#define VOX_COPY_PLOT_COUNTER 9   /* raises the writer's plot counter; returns 0 */
+#define VOX_COPY_SATELLITE_C 10   /* vox_CopySatellite, two-byte satellite codes */
+#define VOX_COPY_SATELLITE_D 11   /* vox_CopySatelliteShort, two-byte satellite codes */
 
 VOX_BEGIN_DECLS
 
@@ -235,16 +235,14 @@ VOX_API int32_t VOX_CALL vox_SetFanResultEx(void* writer, uint32_t fan_id,
  * quality is 0 when any of the flag bits 13 to 29 is set, else 4, 4, 5, 2 for the values 0 to
  * 3 of bits 0-1. 0 for a null stream, else 1. */
 VOX_API int32_t VOX_CALL vox_SetNextRay(TRayStream* stream, const vox_RayData* ray);
-VOX_API int32_t VOX_CALL vox_SetNextRayEx(void* writer, TRayStream* stream,
-                                          const vox_RayData* ray);
+VOX_API int32_t VOX_CALL vox_SetNextRayEx(void* writer, TRayStream* stream, const vox_RayData* ray);
 
 /* Stores a record of the given data kind (VOX_COPY_*); size is the record's size in bytes.
  * 1 when the kind was handled, 0 for an unknown kind, a size below the kind's minimum, or a
  * span whose vector or fan does not exist. */
-VOX_API int32_t VOX_CALL vox_CopyData(uint32_t kind, const vox_CopyDataRec* record,
-                                      uint32_t size);
-VOX_API int32_t VOX_CALL vox_CopyDataEx(void* writer, uint32_t kind,
-                                        const vox_CopyDataRec* record, uint32_t size);
+VOX_API int32_t VOX_CALL vox_CopyData(uint32_t kind, const vox_CopyDataRec* record, uint32_t size);
+VOX_API int32_t VOX_CALL vox_CopyDataEx(void* writer, uint32_t kind, const vox_CopyDataRec* record,
+                                        uint32_t size);
 
 /* Plot streams: open, describe each line (vox_SetLine), write the descriptions
  * (vox_CreatePlot), then per epoch send the time on line 1 followed by the values of the
