@@ -13,8 +13,16 @@ scratch=$(mktemp -d "${TMPDIR:-/tmp}/vox-demo-XXXXXX")
 trap 'rm -rf "$scratch"' EXIT
 mkdir -p "$scratch/tmp/engine"   # an "engine" folder switches the engine log on
 
-# CR LF line ends and a run variable, as job files from other systems may carry them.
-printf '[JOB]\r\nName=Demo survey $(SITE)\r\nResultPath=results/$(SITE).res\r\n' > "$scratch/demo.job"
+# CR LF line ends and a run variable, as job files from other systems may carry them. When
+# the team's shared data is beside the repository, a precise orbit file joins the job: data
+# preparation scans it and lists its satellites in the engine log.
+orbit="$(cd "$(dirname "$0")/.." && pwd)/../shared/data/gnss/igs15904.sp3"
+{
+  printf '[JOB]\r\nName=Demo survey $(SITE)\r\nResultPath=results/$(SITE).res\r\n'
+  if [[ -f "$orbit" ]]; then
+    printf 'NumFiles=1\r\n[FILE:1]\r\nName=%s\r\n' "$(realpath "$orbit")"
+  fi
+} > "$scratch/demo.job"
 mkdir -p "$scratch/results"
 
 echo "demo: job file $scratch/demo.job:"
@@ -30,10 +38,11 @@ if [[ -f "$result" ]]; then
 fi
 for log in "$scratch"/tmp/engine/OUT*; do
   [[ -f "$log" ]] || continue
-  echo "demo: engine log $(basename "$log"):"
-  sed 's/^/    /' "$log"
+  echo "demo: engine log $(basename "$log") ($(wc -l < "$log") lines), first lines:"
+  head -n 12 "$log" | sed 's/^/    /'
 done
-echo "demo: the job was parsed, its result file opened with a header, the pipeline's"
-echo "      messages written and the file closed with its end record; raw data scanning and"
-echo "      engines join the demo when they arrive. voxrun exited with $status."
+echo "demo: the job was parsed, its result file opened with a header, its files scanned and"
+echo "      listed in the engine log, the pipeline's messages written and the result file"
+echo "      closed with its end record; the raw filter and the engines join the demo when"
+echo "      their scheduling arrives. voxrun exited with $status."
 exit "$status"

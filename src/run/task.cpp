@@ -20,6 +20,7 @@ TTask::~TTask() {
     delete owned;
   }
   thread_writers.clear();
+  meteo_tracks.Clear();
   solution_lock.Close();
   result_file.Close();
   current_engine = nullptr;
@@ -27,6 +28,7 @@ TTask::~TTask() {
   job.static_params.reset();
   job.engine_params.reset();
   precise.Clear();
+  ephemerides.Clear();
   job.receivers.Clear();
   job.antennas.Clear();
   job.fans.Clear();

@@ -22,6 +22,8 @@
 #include "base/tlock.h"
 #include "engine/job_engines.h"
 #include "job/job_model.h"
+#include "raw/ephemeris_store.h"
+#include "raw/meteo_track.h"
 #include "raw/precise_store.h"
 #include "results/result_file.h"
 
@@ -29,8 +31,9 @@ namespace vox {
 
 struct TTask {
   TTask();
-  // Tears down in a fixed order: unreleased thread writers, the lock, the result file, the
-  // engines (static first) and their parameter blocks, the stores, then the item lists.
+  // Tears down in a fixed order: unreleased thread writers, the meteorological tracks, the lock,
+  // the result file, the engines (static first) and their parameter blocks, the stores, then the
+  // item lists.
   ~TTask();
   TTask(const TTask&) = delete;
   TTask& operator=(const TTask&) = delete;
@@ -40,7 +43,11 @@ struct TTask {
   std::unique_ptr<JobEngines> engines = std::make_unique<JobEngines>();
   // The engine being run; a break calls its _eng_BreakProcess. Null outside engine calls.
   TEngine* current_engine = nullptr;
+  // Satellite stores and meteorological tracks, filled by the raw file scans of data
+  // preparation and only read afterwards.
+  EphemerisStore ephemerides;
   PreciseStore precise;
+  MeteoTrackList meteo_tracks;
 
   uint32_t done_units = 0;
   uint32_t total_units = 0;

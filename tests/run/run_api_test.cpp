@@ -126,6 +126,21 @@ TEST_F(RunApiTest, FailuresEndWithTheirExitCodes) {
   EXPECT_NE(logs.back().find("Can not open result file: "), std::string::npos) << logs.back();
 }
 
+TEST_F(RunApiTest, UnusableRawFileFailsPreparationWith8AfterScanningEveryFile) {
+  const std::string job = vox::test::WriteFile(
+      scratch_.File("prep.job"), vox::test::JobText("Prep", "prep.res", "NumFiles=2\n") +
+                                     "[FILE:1]\nName=missing.raw\n" +
+                                     "[FILE:2]\nName=" VOX_SHARED_DIR "/data/gnss/igs15904.sp3\n");
+  EXPECT_EQ(RunJob(job), 8u);
+  std::vector<std::string> messages;
+  for (const auto& r : vox::test::ReadResultRecords(scratch_.File("prep.res")))
+    if (r.kind == 29) messages.push_back(vox::test::MessageText(r));
+  EXPECT_EQ(messages, (std::vector<std::string>{"Can not prepare data"}));
+  const std::string log = temp_.EngineLogTexts().back();
+  EXPECT_NE(log.find("Precise Ephemeris:\nG01 - "), std::string::npos);  // the orbit file too
+  EXPECT_NE(log.find("Can not prepare data\n"), std::string::npos);
+}
+
 TEST_F(RunApiTest, TextRunNeverReports5AndTakesCrLfText) {
   const std::filesystem::path previous = std::filesystem::current_path();
   std::filesystem::current_path(scratch_.path());

@@ -33,7 +33,7 @@ void ProgressView::Update(uint32_t percent, double elapsed_seconds) {
     std::fprintf(out_, "\r%s", BarText(percent, elapsed_seconds, 40).c_str());
     bar_drawn_ = true;
   } else {
-    if (static_cast<int>(percent) == last_percent_) return;
+    if (static_cast<int>(percent) == last_percent_ || (last_percent_ < 0 && percent == 0)) return;
     std::fprintf(out_, "progress %u%% after %s\n", percent, ClockText(elapsed_seconds).c_str());
   }
   std::fflush(out_);

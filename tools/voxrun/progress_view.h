@@ -29,7 +29,7 @@ class ProgressView {
   bool terminal_;
   bool quiet_;
   bool bar_drawn_ = false;
-  int last_percent_ = -1;
+  int last_percent_ = -1;  // a terminal draws 0 %; plain lines start with the first rise
   long last_second_ = -1;
 };
 
