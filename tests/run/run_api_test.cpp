@@ -15,6 +15,8 @@
 #include "support/scratch.h"
 #include "vox/vox_host.h"
 
+extern "C" uint32_t PingFromC(vox_ControlHandle handle);
+
 namespace {
 
 // Everything the host callback has been told. One callback serves the whole process: the
@@ -206,7 +208,8 @@ TEST_F(RunApiTest, BreakDuringARunEndsWith10) {
 TEST_F(RunApiTest, HandleOfAnEndedJobIsHarmless) {
   BlockedJob blocked(scratch_.File("stale.job"));
   vox_ControlHandle old = RunProcess(blocked.path().c_str());
-  EXPECT_EQ(SendEngineControl(old, VOX_CMD_PING, 0), 4u);
+  EXPECT_EQ(PingFromC(old), 4u);
+  EXPECT_NE(SendEngineControl(old, VOX_CMD_THREAD_ID, 0), 0u);
   char title[64];
   EXPECT_EQ(GetEngineControlTitle(old, title, sizeof title), 19u);
   EXPECT_STREQ(title, "EngineControlWindow");
@@ -219,6 +222,7 @@ TEST_F(RunApiTest, HandleOfAnEndedJobIsHarmless) {
   ASSERT_NE(current, old);
   for (uint32_t command = 0; command <= 7; ++command)
     EXPECT_EQ(SendEngineControl(old, command, 0), 0u) << command;
+  EXPECT_EQ(PingFromC(old), 0u);
   EXPECT_EQ(GetEngineControlTitle(old, title, sizeof title), 0u);
   next.Release(vox::test::JobText("Next", "next.res"));
   EXPECT_EQ(WaitForEnd(current), 0u);  // the break sent on the old handle reached nothing
