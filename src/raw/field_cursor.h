@@ -40,7 +40,9 @@ struct BigEndianOrder {
 
 using ByteSpan = std::span<const uint8_t>;
 
-template <typename Order>
+// kChecked = false drops the per-field bounds tests; callers use it only after making sure the
+// span holds the largest size the decoded item can take.
+template <typename Order, bool kChecked = true>
 class FieldCursor {
  public:
   explicit FieldCursor(ByteSpan bytes)
@@ -48,7 +50,7 @@ class FieldCursor {
 
   template <typename T>
   T Get() {
-    if (static_cast<size_t>(end_ - p_) < sizeof(T)) {
+    if (kChecked && static_cast<size_t>(end_ - p_) < sizeof(T)) {
       p_ = end_;
       overrun_ = true;
       return T{};
@@ -93,7 +95,7 @@ class FieldCursor {
   }
 
   void Skip(size_t n) {
-    if (static_cast<size_t>(end_ - p_) < n) {
+    if (kChecked && static_cast<size_t>(end_ - p_) < n) {
       p_ = end_;
       overrun_ = true;
       return;

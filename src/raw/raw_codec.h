@@ -59,9 +59,14 @@ struct RawCodec {
     return c.Result();
   }
 
+  // The largest sizes of the blocks of epoch records.
+  static constexpr size_t kMaxSatBlock = 4;
+  static constexpr size_t kMaxSignal = 2 + 2 + 2 + 8 + 8 + 4 + 4;
+
   // Tag 8: one-byte code, one byte not interpreted, B2, B3.
+  template <bool kChecked = true>
   static size_t SatBlock8(ByteSpan b, SatBlock& s) {
-    Cursor c(b);
+    FieldCursor<Order, kChecked> c(b);
     s.code = c.U8();
     c.Skip(1);
     s.b2 = c.U8();
@@ -72,8 +77,9 @@ struct RawCodec {
   }
 
   // Tag 51: two-byte code, B2, B3.
+  template <bool kChecked = true>
   static size_t SatBlock51(ByteSpan b, SatBlock& s) {
-    Cursor c(b);
+    FieldCursor<Order, kChecked> c(b);
     s.code = c.U16();
     s.b2 = c.U8();
     s.b3 = c.U8();
@@ -82,8 +88,9 @@ struct RawCodec {
     return c.Result();
   }
 
+  template <bool kChecked = true>
   static size_t Signal8(ByteSpan b, SignalBlock& s) {
-    Cursor c(b);
+    FieldCursor<Order, kChecked> c(b);
     s.flags = c.U16();
     s.byte_a = (s.flags & kSig8ByteA) ? c.U8() : 0;
     s.byte_b = (s.flags & kSig8ByteB) ? c.U8() : 0;
@@ -91,8 +98,9 @@ struct RawCodec {
     return c.Result();
   }
 
+  template <bool kChecked = true>
   static size_t Signal51(ByteSpan b, SignalBlock& s) {
-    Cursor c(b);
+    FieldCursor<Order, kChecked> c(b);
     s.flags = c.U16();
     s.i16 = (s.flags & kSig51I16) ? c.I16() : 0;
     s.u16 = (s.flags & kSig51U16) ? c.U16() : 0;
@@ -124,7 +132,7 @@ struct RawCodec {
     return c.Result();
   }
   static bool Check(const GpsEphemerisRecord& r) {
-    return InWindow(r.g8, -33, 8) && InWindow(r.g20, -33, 8);
+    return InWindow<-33, 8>(r.g8) && InWindow<-33, 8>(r.g20);
   }
 
   static size_t BdsEphemeris(ByteSpan b, BdsEphemerisRecord& r) {
@@ -167,7 +175,7 @@ struct RawCodec {
     return c.Result();
   }
   static bool Check(const GlonassEphemerisRecord& r) {
-    return InWindow(r.position[0], -33, 18) && InWindow(r.position[1], -33, 18);
+    return InWindow<-33, 18>(r.position[0]) && InWindow<-33, 18>(r.position[1]);
   }
 
   static size_t SbasEphemeris(ByteSpan b, SbasEphemerisRecord& r) {
@@ -183,7 +191,7 @@ struct RawCodec {
     return c.Result();
   }
   static bool Check(const SbasEphemerisRecord& r) {
-    return InWindow(r.s3_s5[0], -33, 28) && InWindow(r.s3_s5[1], -33, 28);
+    return InWindow<-33, 28>(r.s3_s5[0]) && InWindow<-33, 28>(r.s3_s5[1]);
   }
 
   static size_t GalileoEphemeris(ByteSpan b, GalileoEphemerisRecord& r) {
@@ -223,7 +231,7 @@ struct RawCodec {
     return c.Result();
   }
   static bool Check(const SatPositionRecord& r) {
-    return r.valid && InWindow(r.position[0], -33, 28) && InWindow(r.position[1], -33, 28);
+    return r.valid && InWindow<-33, 28>(r.position[0]) && InWindow<-33, 28>(r.position[1]);
   }
 
   static size_t MeteoSensor(ByteSpan b, MeteoSensorRecord& r) {
@@ -260,7 +268,8 @@ struct RawCodec {
 
  private:
   // The optional values shared by both signal block kinds, each checked as it is read.
-  static void ReadValues(Cursor& c, SignalBlock& s) {
+  template <typename AnyCursor>
+  static void ReadValues(AnyCursor& c, SignalBlock& s) {
     if (s.flags & kSigCode) {
       s.code = c.F64();
       if (!CodeValueOk(s.code)) s.flags &= ~kSigCode;

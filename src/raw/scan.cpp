@@ -52,12 +52,44 @@ void RegisterEpochTime(ScanState& st, const TimeMs& t, uint32_t position) {
   st.intervals.Add(t);
 }
 
+// Decodes a satellite or signal block, without per-field bounds tests when the body surely
+// holds the largest block.
+template <typename Order>
+size_t NextSatBlock(ByteSpan body, bool tag51, SatBlock& sat) {
+  using C = RawCodec<Order>;
+  if (body.size() >= C::kMaxSatBlock)
+    return tag51 ? C::template SatBlock51<false>(body, sat)
+                 : C::template SatBlock8<false>(body, sat);
+  return tag51 ? C::template SatBlock51<true>(body, sat) : C::template SatBlock8<true>(body, sat);
+}
+
+template <typename Order>
+size_t NextSignal(ByteSpan body, bool tag51, SignalBlock& s) {
+  using C = RawCodec<Order>;
+  if (body.size() >= C::kMaxSignal)
+    return tag51 ? C::template Signal51<false>(body, s) : C::template Signal8<false>(body, s);
+  return tag51 ? C::template Signal51<true>(body, s) : C::template Signal8<true>(body, s);
+}
+
+// The signal mask bits of one signal block (the scan's reading of the kind bits for tag 8).
+inline uint32_t MaskBits(const SignalBlock& s, const SatBlock& sat, bool tag51) {
+  if (!tag51) {
+    const SignalSlot slot = Slot8ForMask(Kind8(s.flags));
+    return ((s.flags & kSigCode) ? CodeBit(slot) : 0u) |
+           ((s.flags & kSigPhase) ? PhaseBit(slot) : 0u);
+  }
+  const SignalSlot slot = Slot51Fast(sat.group, s.flags & 0x7F);
+  if (slot == kNoSlot) return 0;
+  const bool code_ok = (s.flags & kSigCode) && !(s.flags & kSigCodeBad);
+  const bool phase_ok = (s.flags & kSigPhase) && !(s.flags & kSigPhaseBad);
+  return (code_ok ? CodeBit(slot) : 0u) | (phase_ok ? PhaseBit(slot) : 0u);
+}
+
 // The signal masks and L2C notes of one epoch record.
 template <typename Order>
 void ScanEpoch(ScanState& st, ByteSpan body, bool tag51, uint32_t position) {
-  using C = RawCodec<Order>;
   EpochHeader h;
-  size_t n = C::Epoch(body, h);
+  size_t n = RawCodec<Order>::Epoch(body, h);
   if (n == 0) return;  // too short to hold an epoch
   body = body.subspan(n);
 
@@ -65,56 +97,47 @@ void ScanEpoch(ScanState& st, ByteSpan body, bool tag51, uint32_t position) {
   if (h.ms_of_day < st.time_ref.ms_of_day) ++raw.day;
   const TimeMs t = ToTimeMs(raw);
 
-  uint32_t* masks = st.file.signal_masks;
+  uint32_t masks[kSystemCount] = {};
   for (unsigned i = 0; i < h.sat_count; ++i) {
     SatBlock sat;
-    n = tag51 ? C::SatBlock51(body, sat) : C::SatBlock8(body, sat);
+    n = NextSatBlock<Order>(body, tag51, sat);
     if (n == 0) break;
     body = body.subspan(n);
-    const bool known = tag51 ? sat.group <= 5 : true;
+    // A two-byte code of an unknown group names no system; its blocks are only consumed.
+    const bool known = !tag51 || sat.group <= 5;
     const unsigned system = static_cast<unsigned>(SystemOf(sat.sat));
     if (sat.valid && st.details) st.details->satellites_seen.set(SatIndexOf(sat.sat));
     const bool gps0 = tag51 && sat.group == 0;
+    uint32_t sat_mask = 0;
     double l2c = 0.0, l2p = 0.0;
     bool truncated = false;
     for (;;) {
       SignalBlock s;
-      n = tag51 ? C::Signal51(body, s) : C::Signal8(body, s);
+      n = NextSignal<Order>(body, tag51, s);
       if (n == 0) {
         truncated = true;
         break;
       }
       body = body.subspan(n);
-      if (known) {
-        if (!tag51) {
-          const SignalSlot slot = Slot8ForMask(Kind8(s.flags));
-          if (s.flags & kSigCode) masks[system] |= CodeBit(slot);
-          if (s.flags & kSigPhase) masks[system] |= PhaseBit(slot);
-        } else {
-          const uint8_t code = s.flags & 0x7F;
-          const SignalSlot slot = Slot51(sat.group, code);
-          const bool code_ok = (s.flags & kSigCode) && !(s.flags & kSigCodeBad);
-          const bool phase_ok = (s.flags & kSigPhase) && !(s.flags & kSigPhaseBad);
-          if (slot != kNoSlot) {
-            if (code_ok) masks[system] |= CodeBit(slot);
-            if (phase_ok) masks[system] |= PhaseBit(slot);
-          }
-          if (gps0 && phase_ok) {
-            const unsigned number = NumberOf(sat.sat);
-            if (code == 32 || code == 34 || code == 35) {
-              l2c = s.phase;
-              if (number >= 1 && number <= 32) st.c2.working_l2c_mask |= 1u << (number - 1);
-            } else if (code == 36 || code == 37) {
-              l2p = s.phase;
-            }
-          }
+      sat_mask |= MaskBits(s, sat, tag51);
+      if (gps0 && (s.flags & kSigPhase) && !(s.flags & kSigPhaseBad)) {
+        const uint8_t code = s.flags & 0x7F;
+        const unsigned number = NumberOf(sat.sat);
+        if (code == 32 || code == 34 || code == 35) {
+          l2c = s.phase;
+          if (number >= 1 && number <= 32) st.c2.working_l2c_mask |= 1u << (number - 1);
+        } else if (code == 36 || code == 37) {
+          l2p = s.phase;
         }
       }
       if (!(s.flags & kSigMore)) break;
     }
+    if (known) masks[system] |= sat_mask;
     if (gps0 && l2c != 0.0 && l2p != 0.0) st.c2.Add(NumberOf(sat.sat), l2c, l2p);
     if (truncated) break;
   }
+  for (int k = 0; k < kSystemCount; ++k)
+    st.file.signal_masks[k] |= masks[k];
 
   RegisterEpochTime(st, t, position);
   if (h.sat_count > st.file.max_satellites) st.file.max_satellites = h.sat_count;

@@ -4,6 +4,7 @@
 
 #include <cstring>
 
+#include "raw/preparation_listing.h"
 #include "scan_test_util.h"
 
 namespace vox {
@@ -141,6 +142,17 @@ TEST(ScanByteOrder, BigEndianTwinGivesIdenticalResults) {
   EXPECT_FLOAT_EQ(a.meteo.head()->first->data.height, 123.5f);
   EXPECT_EQ(a.meteo.head()->first->data.humidity, 50.0f);
   EXPECT_EQ(a.details.satellites_seen.count(), 5u);
+
+  std::string listings[2];
+  for (int i = 0; i < 2; ++i) {
+    ItemList<TOccupItem> occupations(false);
+    occupations.Append(runs[i].occupations[0].get());
+    ItemList<TVectorItem> vectors;
+    WritePreparationListing(runs[i].ephemerides, runs[i].precise, occupations, vectors,
+                            {&ScanRun::Collect, &listings[i]});
+  }
+  EXPECT_EQ(listings[0], listings[1]);
+  EXPECT_NE(listings[0].find("007 - G07 - "), std::string::npos) << listings[0];
 }
 
 // ---- walk statuses
