@@ -9,6 +9,7 @@
 #include <fstream>
 #include <iterator>
 
+#include "base/buf_file.h"
 #include "broadcast.h"
 #include "combinations.h"
 #include "double_difference.h"
@@ -16,6 +17,7 @@
 #include "point_solution.h"
 #include "raw/ephemeris_store.h"
 #include "raw/raw_decoder.h"
+#include "raw/record_reader.h"
 #include "raw_fields.h"
 #include "sim_signals.h"
 #include "survey.h"
@@ -353,6 +355,110 @@ TEST(Simulator, SameSeedSameFilesOtherSeedOtherFiles) {
   for (const char* f : {"base.raw", "kinematic.raw", "survey.job", "truth.txt"})
     EXPECT_TRUE(fs::exists(root / "a" / f)) << f;
   fs::remove_all(root);
+}
+
+// What vox's own reader finds in a file voxsim wrote.
+struct FileContents {
+  int start_status = -1;
+  bool reached_end = false;
+  int time_refs = 0, leap_seconds = -1, ephemerides = 0, epochs = 0, bad_ephemerides = 0;
+  int signals = 0, dropped_values = 0, unexpected_signals = 0;
+  double first_epoch_day = -1;
+  std::vector<vox_EphemerisData> ephemeris_records;
+};
+
+FileContents ReadBack(const std::string& path) {
+  FileContents c;
+  vox::TBufFile file;
+  EXPECT_TRUE(file.OpenRead(path));
+  vox::RecordReader reader(file);
+  c.start_status = reader.Start().status;
+  if (c.start_status != 0) return c;
+  const vox::RawDecoder& d = reader.decoder();
+  while (reader.next_tag() != vox::kTagEnd) {
+    if (reader.Next() != vox::ReadResult::kOk) return c;
+    const vox::ByteSpan body = reader.body();
+    if (reader.tag() == vox::kTagTimeRef) {
+      vox::TimeRefRecord r;
+      d.time_ref(body, r);
+      ++c.time_refs;
+      EXPECT_TRUE(r.IsGps());
+      c.leap_seconds = r.has_leap ? static_cast<int>(r.leap_seconds) : -1;
+      if (c.first_epoch_day < 0) c.first_epoch_day = r.time.day;
+    } else if (reader.tag() == vox::kTagGpsEphemeris || reader.tag() == vox::kTagGpsHighEphemeris) {
+      vox::GpsEphemerisRecord r;
+      d.gps_ephemeris(body, r);
+      ++c.ephemerides;
+      if (!vox::PassesCheck(r)) ++c.bad_ephemerides;
+      c.ephemeris_records.push_back(
+          vox::MakeGpsEphemeris(r, reader.tag() == vox::kTagGpsHighEphemeris));
+    } else if (reader.tag() == vox::kTagEpoch51) {
+      ++c.epochs;
+      vox::EpochHeader h;
+      size_t at = d.epoch(body, h);
+      for (unsigned k = 0; k < h.sat_count; ++k) {
+        vox::SatBlock sb;
+        at += d.sat_block51(body.subspan(at), sb);
+        EXPECT_TRUE(sb.valid);
+        EXPECT_GT(sb.b2, 30);  // C/N0 in dB-Hz
+        for (bool more = true; more;) {
+          vox::SignalBlock sig;
+          at += d.signal51(body.subspan(at), sig);
+          more = (sig.flags & 0x80) != 0;
+          ++c.signals;
+          const unsigned code = sig.flags & 0x7F;
+          if (code != VOX_SIGNAL_GPS_L1CA && code != VOX_SIGNAL_GPS_L2P) ++c.unexpected_signals;
+          if ((sig.flags & 0x300) != 0x300)  // a value failed its check and was dropped
+            ++c.dropped_values;
+        }
+      }
+      EXPECT_EQ(at, body.size());
+    }
+  }
+  c.reached_end = true;
+  return c;
+}
+
+TEST(Simulator, FilesReadBackThroughVoxInBothByteOrders) {
+  namespace fs = std::filesystem;
+  const fs::path root = fs::temp_directory_path() / ("voxsim_read_" + std::to_string(::getpid()));
+  for (auto order : {voxtools::RawOrder::kLittle, voxtools::RawOrder::kBig}) {
+    voxsim::SurveyOptions o;
+    // Crosses midnight and a toe: a second time reference and a new ephemeris set are due.
+    o.start = voxsim::GpsSecondsOf(2024, 3, 15, 22, 30, 0);
+    o.duration = 5400;
+    o.interval = 30;
+    o.order = order;
+    o.folder = root.string();
+    const voxsim::Survey s = voxsim::MakeSurvey(o);
+    ASSERT_EQ(voxsim::WriteSurvey(s), "");
+    const FileContents c = ReadBack((root / "kinematic.raw").string());
+    EXPECT_EQ(c.start_status, 0);
+    EXPECT_TRUE(c.reached_end);
+    EXPECT_EQ(c.time_refs, 2);
+    EXPECT_EQ(c.leap_seconds, 18);
+    EXPECT_EQ(c.epochs, static_cast<int>(s.EpochCount()));
+    EXPECT_EQ(c.bad_ephemerides, 0);
+    EXPECT_EQ(c.unexpected_signals, 0);
+    EXPECT_EQ(c.dropped_values, 0);
+    EXPECT_GT(c.signals, 2 * 6 * c.epochs);  // at least six satellites, two signals each
+    // Sets of toe 22:00, 00:00 at the start, 02:00 written once 00:00 has passed.
+    EXPECT_EQ(c.ephemerides, 3 * static_cast<int>(s.satellites.size()));
+    // The record time is toe, and the engine's unpacking gives back the simulator's set.
+    for (const vox_EphemerisData& rec : c.ephemeris_records) {
+      vox_GpsOrbitParams p{};
+      ASSERT_EQ(vox_GpsOrbitFromEphemeris(&rec, &p), 1);
+      EXPECT_EQ(rec.head.seconds, p.week * 604800u + static_cast<uint32_t>(p.toe));
+      const auto sat = std::find_if(s.satellites.begin(), s.satellites.end(),
+                                    [&](const auto& x) { return x.prn == rec.head.sat; });
+      ASSERT_NE(sat, s.satellites.end());
+      const vox_GpsOrbitParams q = s.BroadcastAt(*sat, rec.head.seconds);
+      EXPECT_EQ(p.m0, q.m0);
+      EXPECT_EQ(p.omega0, q.omega0);
+      EXPECT_EQ(p.af0, q.af0);
+    }
+    fs::remove_all(root);
+  }
 }
 
 }  // namespace
