@@ -85,12 +85,15 @@ uint32_t DeleteThread(TTask& task, vox_ThreadContext* context) {
   }
   context->writer = nullptr;
   writer->Close();
-  if (!writer->path().empty()) {
-    task.result_file.Append(writer->path());
-    platform::RemoveFile(writer->path());
+  {
+    // The merge writes into the task's file, which other threads write too: occupation and
+    // solution records under this same lock. Holding it keeps a merged block from being
+    // interleaved with those records (or two threads' blocks with each other).
+    TLockGuard lock(task.solution_lock);
+    if (!writer->path().empty()) task.result_file.Append(writer->path());
+    task.worker_progress_sum += 100u - writer->progress;
   }
-  TLockGuard lock(task.solution_lock);
-  task.worker_progress_sum += 100u - writer->progress;
+  if (!writer->path().empty()) platform::RemoveFile(writer->path());
   return 0;
 }
 

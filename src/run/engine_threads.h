@@ -3,8 +3,9 @@
 //
 // Threads: the callbacks run on whichever thread the engine calls them from, concurrently;
 // InitNewThread and DeleteThread on the thread that registers or releases an engine thread.
-// The solution lock guards the worker progress sum and the registry of thread writers; a
-// thread writer itself is written only by its own thread, so it needs no lock.
+// The solution lock guards the worker progress sum, the registry of thread writers and the
+// merge of a thread's file into the task's result file; a thread writer itself is written
+// only by its own thread, so it needs no lock.
 //
 // Progress: the task's writer reports (done units * 100 + percent) / total units; thread
 // writers add up into the worker progress sum, each counting its last percentage, and a

@@ -3,6 +3,8 @@
 #include <gtest/gtest.h>
 
 #include <memory>
+#include <string>
+#include <thread>
 #include <vector>
 
 #include "platform/platform.h"
@@ -169,6 +171,42 @@ TEST_F(EngineThreadsTest, ThreadFilesAreMergedOneBlockPerThreadInReleaseOrder) {
   EXPECT_EQ(texts, (std::vector<std::string>{"b1", "b2", "a1", "a2"}));
   EXPECT_EQ(headers, 1);
   EXPECT_EQ(ends, 1);
+}
+
+TEST_F(EngineThreadsTest, ThreadsReleasedAtOnceKeepTheirBlocksWholeBesideLockedRecords) {
+  constexpr int kThreads = 4;
+  constexpr int kMessages = 300;
+  std::vector<std::thread> threads;
+  for (int t = 0; t < kThreads; ++t) {
+    threads.emplace_back([this, t] {
+      vox_ThreadContext c = MakeThreadContext(task_, 0, 1);
+      InitNewThread(task_, &c);
+      const std::string text = "thread " + std::to_string(t);
+      for (int i = 0; i < kMessages; ++i)
+        MessageProc(c.writer, 1, text.c_str());
+      DeleteThread(task_, &c);
+    });
+  }
+  // Records that other threads write to the task's file under the solution lock meanwhile.
+  for (int i = 0; i < 200; ++i) {
+    TLockGuard lock(task_.solution_lock);
+    task_.result_file.WriteMessage("locked", 1);
+  }
+  for (auto& thread : threads)
+    thread.join();
+  ASSERT_TRUE(task_.result_file.Close());
+
+  const auto records = test::ReadResultRecords(scratch_.File("job.res"));
+  ASSERT_FALSE(records.empty());
+  EXPECT_EQ(records.back().kind, 0);  // the framing held to the end
+  std::vector<std::string> blocks;    // runs of one thread's messages
+  for (const auto& r : records) {
+    const std::string text = test::MessageText(r);
+    if (text.rfind("thread ", 0) != 0) continue;
+    if (blocks.empty() || blocks.back() != text) blocks.push_back(text);
+  }
+  EXPECT_EQ(blocks.size(), static_cast<size_t>(kThreads));
+  EXPECT_EQ(records.size(), 1u + kThreads * kMessages + 200 + 1);
 }
 
 TEST_F(EngineThreadsTest, ReleasingTwiceOrReleasingTheTaskWriterIsHarmless) {

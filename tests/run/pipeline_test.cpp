@@ -76,15 +76,6 @@ TEST_F(PipelineTest, BreakRequestedDuringTheRunEndsWith10AfterAProperClose) {
   TheRun().break_flag.store(0);
 }
 
-TEST_F(PipelineTest, RelativeResultPathOfATextJobIsTakenAgainstTheCurrentFolder) {
-  const std::filesystem::path previous = std::filesystem::current_path();
-  std::filesystem::current_path(scratch_.path());
-  const uint32_t code = RunText(test::JobText("C", "c.res"));
-  std::filesystem::current_path(previous);
-  EXPECT_EQ(code, 0u);
-  EXPECT_TRUE(std::filesystem::exists(scratch_.File("c.res")));
-}
-
 TEST_F(PipelineTest, FileJobsWithCrLfAndLfLineEndsRunAlike) {
   const std::string lf = test::WriteFile(scratch_.File("lf.job"), test::JobText("L", "lf.res"));
   const std::string crlf =
@@ -93,12 +84,6 @@ TEST_F(PipelineTest, FileJobsWithCrLfAndLfLineEndsRunAlike) {
   EXPECT_EQ(RunFile(crlf), 0u);
   EXPECT_EQ(test::ReadFile(scratch_.File("lf.res")), test::ReadFile(scratch_.File("crlf.res")));
   EXPECT_EQ(LastJobLabels().name, "L");
-}
-
-TEST_F(PipelineTest, VariablesAreSubstitutedBeforeParsing) {
-  const std::string job = test::WriteFile(scratch_.File("v.job"), test::JobText("V", "$(OUT).res"));
-  EXPECT_EQ(RunFile(job, "OUT=named"), 0u);
-  EXPECT_TRUE(std::filesystem::exists(scratch_.File("named.res")));
 }
 
 TEST_F(PipelineTest, UnreadableOrUnsubstitutableJobFileEndsWith5AndLeavesWindowAndLogOpen) {
