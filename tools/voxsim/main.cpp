@@ -2,6 +2,7 @@
 // base, a static rover and a moving rover, a job file and the truth), the same for the same
 // seed.
 #include <CLI/CLI.hpp>
+#include <cmath>
 #include <cstdio>
 #include <string>
 
@@ -44,10 +45,9 @@ int main(int argc, char** argv) {
     std::fprintf(stderr, "voxsim: --start lies before the GPS time origin\n");
     return 2;
   }
+  // Epoch times are whole milliseconds of the day in the raw files.
   const double interval_ms = o.interval * 1000.0;
-  if (interval_ms != static_cast<double>(static_cast<long long>(interval_ms + 0.5)) &&
-      std::abs(interval_ms - static_cast<double>(static_cast<long long>(interval_ms + 0.5))) >
-          1e-6) {
+  if (std::fabs(interval_ms - std::round(interval_ms)) > 1e-6) {
     std::fprintf(stderr, "voxsim: --interval must be a whole number of milliseconds\n");
     return 2;
   }
