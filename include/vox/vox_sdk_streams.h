@@ -456,7 +456,7 @@ VOX_API int32_t VOX_CALL vox_CloseRayStream(TRayStream* stream);
  * pointer). */
 VOX_API int32_t VOX_CALL vox_GetSolutionBySolXOccup(uint32_t unused, uint32_t* solution);
 VOX_API int32_t VOX_CALL vox_GetSolutionByVector(uint32_t unused, uint32_t* solution);
-/* The job's kind and name (and MaxExtraBases); the record must not be null. Returns 1. */
+/* The job's kind and name (and MaxExtraBases): 1, or 0 for a null record. */
 VOX_API int32_t VOX_CALL vox_GetSolutionData(vox_SolutionData* out);
 VOX_API int32_t VOX_CALL vox_GetSolutionDataEx(vox_SolutionDataEx* out);
 /* The job's kind: 1 static, 2 and 3 kinematic, 0 unknown. */
