@@ -156,6 +156,13 @@ TEST_F(ProbeEngineTest, HonoursABreakRequestAtItsNextProgressReport) {
   EXPECT_EQ(lines.back(), "end");
 }
 
+TEST_F(ProbeEngineTest, CanBeToldToFault) {
+  ASSERT_TRUE(ParseJobIntoTask(task_, Job("ProbeFail=fault\n"), scratch_.File("p.job"), 1));
+  TheRun().current_task.store(&task_);
+  vox_ThreadContext context = MakeThreadContext(task_, 4, 1);
+  EXPECT_DEATH(task_.engines->processing()->ProcessGroup(&context), "");
+}
+
 TEST_F(ProbeEngineTest, CanBeToldToThrow) {
   ASSERT_TRUE(ParseJobIntoTask(task_, Job("ProbeFail=throw\n"), scratch_.File("p.job"), 1));
   TheRun().current_task.store(&task_);

@@ -135,31 +135,6 @@ TEST_F(StreamsApiTest, NavCoordWithoutPointIsStoredButReportsZero) {
   EXPECT_EQ(vox_SetNavCoord(9, &in), 0);
 }
 
-TEST_F(StreamsApiTest, NavCoordsOfTwoOccupationsMakeTheSiteMean) {
-  vox_NavCoordData c{};
-  c.sx = c.sy = c.sz = 1.0f;
-  EXPECT_EQ(vox_SetNavCoord(1, &c), 1);
-  c.x = 1;
-  EXPECT_EQ(vox_SetNavCoord(2, &c), 1);
-  vox_SiteData site{};
-  site.id = 1;
-  EXPECT_EQ(vox_GetSiteData(&site), 1);
-  EXPECT_EQ(site.site_type, VOX_SITE_NAV_MEAN);
-  EXPECT_NEAR(site.x, 0.5, 1e-9);
-  EXPECT_NEAR(site.rms, std::sqrt(1.5), 1e-5);
-}
-
-TEST_F(StreamsApiTest, PointStreamYieldsIdentifiersThenZero) {
-  void* stream = vox_OpenPointStream();
-  ASSERT_NE(stream, nullptr);
-  EXPECT_EQ(vox_GetPointId(stream), 0x01000001u);
-  EXPECT_EQ(vox_GetPointId(stream), 0x01000002u);
-  EXPECT_EQ(vox_GetPointId(stream), 0x01000003u);
-  EXPECT_EQ(vox_GetPointId(stream), 0u);
-  EXPECT_EQ(vox_GetPointId(stream), 0u);
-  vox_ClosePointStream(stream);
-}
-
 TEST_F(StreamsApiTest, AntennaReceiverAndTrackLookups) {
   vox_AntennaData antenna;
   std::memset(&antenna, 0x33, sizeof(antenna));

@@ -104,11 +104,5 @@ TEST_F(NavCoordTest, OccupationWithoutPointStoresButReportsFalse) {
   EXPECT_EQ(stored->y, 2.0);
 }
 
-TEST_F(NavCoordTest, HeldLockIsTakenAgainByTheSameThread) {
-  TLockGuard outer(lock);
-  EXPECT_TRUE(SetNavCoord(*job.FindOccup(1), At(0, 0, 0), lock));
-  EXPECT_TRUE(GetNavCoord(*job.FindOccup(1), lock).has_value());
-}
-
 }  // namespace
 }  // namespace vox
