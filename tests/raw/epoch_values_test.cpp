@@ -223,6 +223,29 @@ TEST_P(EpochValuesTest, TruncatedFileEndsTheStream) {
   EXPECT_EQ(Delivered(*s).size(), 3u);
 }
 
+TEST_P(EpochValuesTest, ThinningGoesOnPastTheGridShiftOfTwoWeeks) {
+  // Hourly epochs over 16 days, one time reference per day, thinned to 7 hours: the grid
+  // base moves on after 1216800 s, and epochs just before the new base must not stop it.
+  RawWriter w(GetParam());
+  w.Header();
+  for (uint32_t day = 0; day < 16; ++day) {
+    w.TimeRef("GPS", {0, kDay + day});
+    for (uint32_t hour = 0; hour < 24; ++hour)
+      w.Epoch(51, hour * 3600000, {Sat(51, 'G', 1, {{0, 2.0e7, {}}})});
+  }
+  w.EndOfData();
+  ScannedFile f(w);
+  ASSERT_EQ(f.file.epoch_count, 16u * 24u);
+  auto s = f.Open(7 * 3600 * 1000);
+  ASSERT_TRUE(s);
+  const std::vector<uint64_t> t = Delivered(*s);
+  ASSERT_GT(t.size(), 2u);
+  for (size_t i = 1; i < t.size(); ++i)
+    EXPECT_GE(t[i] - t[i - 1], 7u * 3600 * 1000) << i;
+  EXPECT_GE(t.back(), Ms(At(15 * 86400))) << "deliveries stopped at " << t.back();
+  EXPECT_GE(t.size(), 50u);
+}
+
 INSTANTIATE_TEST_SUITE_P(Orders, EpochValuesTest,
                          ::testing::Values(RawOrder::kLittle, RawOrder::kBig),
                          [](const auto& info) {
