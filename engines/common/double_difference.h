@@ -19,6 +19,7 @@ struct DdSatellite {
   const vox_GpsOrbitParams* orbit = nullptr;  // broadcast ephemeris valid at the epoch
   double base_code = 0, rover_code = 0;       // m
   double base_phase = 0, rover_phase = 0;     // cycles (L1), 0 when absent
+  bool slip = false;  // either receiver lost the phase count here: a new ambiguity starts
 };
 
 struct DdEpoch {
@@ -61,5 +62,24 @@ BaselineSolution SolveCodeBaseline(std::span<const DdEpoch> epochs, const Vec3& 
 BaselineSolution SolvePhaseBaseline(std::span<const DdEpoch> epochs, const Vec3& base,
                                     const Vec3& rover_approx, const DdOptions& options = {},
                                     double min_ratio = 3.0);
+
+// A moving rover from L1 carrier-phase double differences: one position per epoch, one
+// ambiguity per satellite arc, solved together (the positions are eliminated epoch by epoch,
+// so the cost grows linearly with the epochs), then fixed to integers when the ratio
+// reaches `min_ratio`. Epochs without the reference satellite get no position.
+struct KinematicSolution {
+  bool ok = false;
+  bool fixed = false;
+  double ratio = 0;
+  int reference_sat = 0;
+  std::vector<int> ambiguity_sats;
+  std::vector<double> ambiguities;
+  std::vector<bool> epoch_ok;         // per input epoch
+  std::vector<Vec3> rover;            // per input epoch
+  std::vector<SymMatrix> covariance;  // per input epoch, 3 x 3, m^2 (a-priori weights)
+};
+KinematicSolution SolveKinematicPhase(std::span<const DdEpoch> epochs, const Vec3& base,
+                                      std::span<const Vec3> rover_approx,
+                                      const DdOptions& options = {}, double min_ratio = 3.0);
 
 }  // namespace voxeng
