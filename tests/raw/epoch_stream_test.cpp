@@ -220,6 +220,18 @@ TEST_P(EpochStreamTest, FindAfterMidnightDatesTheFirstEpochsByTheirOwnReference)
   EXPECT_EQ(Delivered(*s), expected) << "a second pass sees the same times";
 }
 
+TEST_P(EpochStreamTest, EpochsPastMidnightWithoutANewReferenceTakeTheNextDay) {
+  RawWriter w(order());
+  w.Header().TimeRef("GPS", {86399000, kDay});
+  for (uint32_t ms : {86399000u, 0u, 1000u})
+    w.Epoch(tag(), ms, {Sat(tag(), 'G', 1, {{0, 2.0e7, {}}})});
+  w.EndOfData();
+  ScannedFile f(w);
+  auto s = f.Open();
+  ASSERT_TRUE(s);
+  EXPECT_EQ(Delivered(*s), SecondsOf({86399, 86400, 86401}));
+}
+
 // Each force-copy rule on a GLONASS satellite (its codes carry the 17 leap seconds of a
 // GPS-time file). Value indices: 2 s code, 2 s + 1 phase of slot s.
 TEST_P(EpochStreamTest, EachForceCopyRuleFillsItsTarget) {
