@@ -72,12 +72,6 @@ TEST_P(MeteoStreamTest, FileWithoutMeteoRecordsHasNoStream) {
   EXPECT_FALSE(f.Open());
 }
 
-TEST_P(MeteoStreamTest, OnlyTheFilesOwnTrackOpens) {
-  MeteoFile f(GetParam(), {{10, 0, 1000.0f}});
-  EXPECT_TRUE(f.Open());
-  EXPECT_FALSE(OpenMeteoCursor(f.tracks, f.file_id + 1));
-}
-
 TEST_P(MeteoStreamTest, OutsideTheSamplesTheNearestComesWhole) {
   MeteoFile f(GetParam(), {{10, 0, 1000.0f}, {20, 500, 1002.0f, 25.0f}});
   auto c = f.Open();
@@ -140,12 +134,6 @@ TEST_P(MeteoStreamTest, CentreOfTheEarthHasTheAxisHeight) {
   MeteoFile f(GetParam(), {{10, 0, 1000.0f}}, std::vector<double>{0.0, 0.0, 0.0});
   auto c = f.Open();
   EXPECT_EQ(Query(*c, At(10)).height, -6378137.0f);
-}
-
-TEST_P(MeteoStreamTest, GivenHeightIsKept) {
-  MeteoFile f(GetParam(), {{10, 0, 1000.0f}, {20, 0, 1000.0f}}, {}, 12.5);
-  auto c = f.Open();
-  EXPECT_EQ(Query(*c, At(15)).height, 12.5f);
 }
 
 INSTANTIATE_TEST_SUITE_P(Orders, MeteoStreamTest,
