@@ -122,11 +122,19 @@ TEST(FieldConventions, WeekComesFromTheRecordTime) {
   EXPECT_EQ(vox_GpsWeekOf(2306u * 604800u + 10u, 604784.0), 2305u);
 }
 
-TEST(BroadcastOrbit, ReproducesSimulatedSatellitesOverTheFitInterval) {
-  const voxsim::Survey s = TestSurvey(4 * 3600.0);
+// Broadcast sets against the simulated orbits over four hours from a start time: mid-week, and
+// across the end of a GPS week, where toe, toc and the node angle all change their week.
+class BroadcastOrbitSpan : public ::testing::TestWithParam<double> {};
+
+TEST_P(BroadcastOrbitSpan, ReproducesSimulatedSatellitesToTheCentimetre) {
+  voxsim::SurveyOptions o;
+  o.start = GetParam();
+  o.duration = 4 * 3600.0;
+  o.seed = 3;
+  const voxsim::Survey s = voxsim::MakeSurvey(o);
   double worst_position = 0, worst_clock = 0;
   for (const auto& sat : s.satellites) {
-    for (double dt = 0; dt <= 4 * 3600.0; dt += 450.0) {
+    for (double dt = 0; dt <= o.duration; dt += 450.0) {
       const double t = s.options.start + dt;
       const vox_GpsOrbitParams p =
           ThroughRawRecord(s.BroadcastAt(sat, t), sat.prn, voxtools::RawOrder::kBig);
@@ -139,6 +147,10 @@ TEST(BroadcastOrbit, ReproducesSimulatedSatellitesOverTheFitInterval) {
   EXPECT_LT(worst_position, 0.01);
   EXPECT_LT(worst_clock, 0.01);
 }
+
+INSTANTIATE_TEST_SUITE_P(Starts, BroadcastOrbitSpan,
+                         ::testing::Values(voxsim::GpsSecondsOf(2024, 3, 13, 9, 0, 0),
+                                           voxsim::GpsSecondsOf(2024, 3, 16, 22, 0, 0)));
 
 TEST(BroadcastOrbit, OrbitIsPlausibleAndVelocityMatchesMotion) {
   const voxsim::Survey s = TestSurvey();
@@ -161,6 +173,40 @@ TEST(BroadcastOrbit, EarthRotationTurnsAboutTheAxis) {
   EXPECT_NEAR(voxeng::Norm(q), voxeng::Norm(p), 1e-6);
   EXPECT_EQ(q[2], p[2]);
   EXPECT_NEAR(q[1], -26000e3 * VOX_GPS_OMEGA_E * 0.07, 0.01);  // ~ -133 m
+}
+
+TEST(LeastSquares, CorrelatedBlockEqualsItsDecorrelatedRows) {
+  // Two observations with a full weight matrix must give what the same information gives
+  // when added as independent rows after decorrelation (W = L L', rows L' A, L' l).
+  voxeng::NormalEquations a(2), b(2);
+  voxeng::SymMatrix w(2);
+  w(0, 0) = 4;
+  w(0, 1) = w(1, 0) = 1;
+  w(1, 1) = 2;
+  a.AddCorrelated({{1, 2}, {3, -1}}, {0.5, -0.25}, w);
+  voxeng::SymMatrix l = w;
+  ASSERT_TRUE(voxeng::Cholesky(l));
+  // L' rows: row k = sum_i L(i,k) * original row i.
+  b.Add({l(0, 0) * 1 + l(1, 0) * 3, l(0, 0) * 2 + l(1, 0) * -1}, l(0, 0) * 0.5 + l(1, 0) * -0.25,
+        1);
+  b.Add({l(1, 1) * 3, l(1, 1) * -1}, l(1, 1) * -0.25, 1);
+  std::vector<double> xa, xb;
+  ASSERT_TRUE(a.Solve(xa));
+  ASSERT_TRUE(b.Solve(xb));
+  EXPECT_NEAR(xa[0], xb[0], 1e-12);
+  EXPECT_NEAR(xa[1], xb[1], 1e-12);
+  EXPECT_NEAR(a.weighted_ll(), b.weighted_ll(), 1e-12);
+}
+
+TEST(LeastSquares, DegenerateGeometryIsRefused) {
+  voxeng::NormalEquations ne(3);
+  ne.Add({1, 1, 0}, 1, 1);
+  ne.Add({2, 2, 0}, 2, 1);  // the same direction again: nothing new about x - y or z
+  ne.Add({0, 0, 0}, 0, 1);
+  std::vector<double> x;
+  EXPECT_FALSE(ne.Solve(x));
+  voxeng::SymMatrix inv;
+  EXPECT_FALSE(voxeng::InvertSpd(ne.matrix(), inv));
 }
 
 TEST(Geodesy, ConversionsRoundTripAndHandleTheAxis) {
