@@ -325,6 +325,43 @@ static inline void vox_GpsOrbitQuantize(vox_GpsOrbitParams* p) {
   p->week = week;
 }
 
+/* Unpacks a GALILEO record (tag 47) with the E-field table above; tgd and tgd2 receive the
+ * two BGDs. Returns 1, or 0 for a record of another system. Note that GALILEO orbits are
+ * evaluated with GALILEO's own gravitational constant, not VOX_GPS_MU. */
+static inline int vox_GalileoOrbitFromEphemeris(const vox_EphemerisData* rec,
+                                                vox_GpsOrbitParams* p) {
+  const vox_GalileoEphemeris* r = &rec->galileo;
+  if (((rec->head.sat >> 8) & 7u) != 3u) return 0;
+  p->toe = (double)r->e1;
+  p->toc = (double)r->e2;
+  p->week = vox_GpsWeekOf(r->seconds, p->toe);
+  p->af2 = r->e3_e6[0];
+  p->af1 = r->e3_e6[1];
+  p->tgd = r->e3_e6[2];
+  p->tgd2 = r->e3_e6[3];
+  p->af0 = r->e7;
+  p->e = r->e8_e10[0];
+  p->sqrt_a = r->e8_e10[1];
+  p->m0 = r->e8_e10[2];
+  p->delta_n = r->e11;
+  p->omega_dot = r->e12;
+  p->idot = r->e13;
+  p->cuc = r->e14;
+  p->cus = r->e15_e17[0];
+  p->crc = r->e15_e17[1];
+  p->crs = r->e15_e17[2];
+  p->omega0 = r->e18;
+  p->omega = r->e19;
+  p->cic = r->e20;
+  p->i0 = r->e21;
+  p->cis = r->e22;
+  p->iode = r->e23;
+  p->ura = r->e24;
+  p->health = r->e25;
+  p->fit_flag = 0;
+  return 1;
+}
+
 /* GLONASS (tag 14) fields of the engine's record. */
 static inline double vox_GlonassTauN(const vox_EphemerisData* rec) {
   return rec->glonass.r1;

@@ -115,6 +115,57 @@ TEST(FieldConventions, CheckedFieldsAndHealthSurviveTheReader) {
   EXPECT_NE(ThroughRawRecord(p, 35, voxtools::RawOrder::kLittle).health, 0u);
 }
 
+TEST(FieldConventions, GalileoRecordRoundTrip) {
+  vox_GpsOrbitParams p{};
+  p.week = 2305;
+  p.toe = 600;
+  p.toc = 1200;
+  p.sqrt_a = 5440.6;
+  p.e = 0.0003;
+  p.i0 = 0.97;
+  p.omega0 = -2.5;
+  p.omega = 0.4;
+  p.m0 = 1.25;
+  p.af0 = -5.123456789e-4;  // 64-bit for GALILEO: kept exactly
+  p.af1 = 0.5f;
+  p.tgd = -2.0f;
+  p.tgd2 = 3.0f;
+  p.delta_n = 1.0f;
+  p.omega_dot = 2.0f;
+  p.idot = 3.0f;
+  p.cuc = 4.0f;
+  p.cus = 5.0f;
+  p.crc = 6.0f;
+  p.crs = 7.0f;
+  p.cic = 8.0f;
+  p.cis = 9.0f;
+  p.iode = 77;
+  p.ura = 107;
+  p.health = 0;
+  voxtools::RawWriter w(voxtools::RawOrder::kBig);
+  w.GalileoEphemeris(voxtools::GalileoEphemerisFromOrbit(p, 11));
+  vox::GalileoEphemerisRecord rec;
+  vox::DecoderFor(vox::ByteOrder::kBig)
+      .galileo_ephemeris(vox::ByteSpan(w.bytes().data() + 3, w.bytes().size() - 5), rec);
+  const vox_EphemerisData full = vox::MakeGalileoEphemeris(rec);
+  vox_GpsOrbitParams q{};
+  EXPECT_EQ(vox_GpsOrbitFromEphemeris(&full, &q), 0);  // not a GPS-layout record
+  ASSERT_EQ(vox_GalileoOrbitFromEphemeris(&full, &q), 1);
+  EXPECT_EQ(q.week, p.week);
+  EXPECT_EQ(q.toe, p.toe);
+  EXPECT_EQ(q.toc, p.toc);
+  const double expected[] = {p.sqrt_a, p.e,   p.i0,   p.omega0,  p.omega,     p.m0,   p.af0,
+                             p.af1,    p.tgd, p.tgd2, p.delta_n, p.omega_dot, p.idot, p.cuc,
+                             p.cus,    p.crc, p.crs,  p.cic,     p.cis};
+  const double got[] = {q.sqrt_a, q.e,   q.i0,   q.omega0,  q.omega,     q.m0,   q.af0,
+                        q.af1,    q.tgd, q.tgd2, q.delta_n, q.omega_dot, q.idot, q.cuc,
+                        q.cus,    q.crc, q.crs,  q.cic,     q.cis};
+  for (size_t k = 0; k < std::size(expected); ++k)
+    EXPECT_EQ(got[k], expected[k]) << k;
+  EXPECT_EQ(q.iode, 77u);
+  EXPECT_EQ(q.ura, 107u);
+}
+
 TEST(FieldConventions, WeekComesFromTheRecordTime) {
   // A record stamped a little before toe's week boundary still decodes to toe's week.
   EXPECT_EQ(vox_GpsWeekOf(2305u * 604800u - 100u, 0.0), 2305u);

@@ -44,4 +44,30 @@ RawGpsEphemeris GpsEphemerisFromOrbit(const vox_GpsOrbitParams& p, unsigned gps_
   return r;
 }
 
+RawGalileoEphemeris GalileoEphemerisFromOrbit(const vox_GpsOrbitParams& p, unsigned number) {
+  RawGalileoEphemeris r;
+  r.number = static_cast<uint8_t>(number);
+  r.time = StampOfSeconds(p.week * VOX_GPS_WEEK_SECONDS + p.toe);
+  r.e1 = static_cast<uint32_t>(p.toe);
+  r.e2 = static_cast<uint32_t>(p.toc);
+  const double small[] = {p.af2, p.af1, p.tgd, p.tgd2};
+  for (int k = 0; k < 4; ++k)
+    r.e3_e6[k] = static_cast<float>(small[k]);
+  const double wide[] = {p.af0, p.e, p.sqrt_a, p.m0};
+  for (int k = 0; k < 4; ++k)
+    r.e7_e10[k] = wide[k];
+  const double rates[] = {p.delta_n, p.omega_dot, p.idot, p.cuc, p.cus, p.crc, p.crs};
+  for (int k = 0; k < 7; ++k)
+    r.e11_e17[k] = static_cast<float>(rates[k]);
+  r.e18 = p.omega0;
+  r.e19 = p.omega;
+  r.e20 = static_cast<float>(p.cic);
+  r.e21 = p.i0;
+  r.e22 = static_cast<float>(p.cis);
+  r.e23 = static_cast<uint16_t>(p.iode);
+  r.e24 = static_cast<uint8_t>(p.ura);
+  r.e25 = static_cast<uint8_t>(p.health);
+  return r;
+}
+
 }  // namespace voxtools

@@ -16,6 +16,10 @@ namespace voxtools {
 RawGpsEphemeris GpsEphemerisFromOrbit(const vox_GpsOrbitParams& p, unsigned gps_number,
                                       uint8_t* tag = nullptr);
 
+// The tag-47 record of GALILEO satellite `number` (1 to 30) with the orbit and clock of `p`
+// (tgd and tgd2 are the two BGDs); the record time is toe on the week of p.
+RawGalileoEphemeris GalileoEphemerisFromOrbit(const vox_GpsOrbitParams& p, unsigned number);
+
 // The RawTime of a GPS time given in seconds since the time origin.
 RawStamp StampOfSeconds(double seconds);
 
