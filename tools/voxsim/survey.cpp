@@ -91,7 +91,7 @@ namespace {
 
 using voxtools::RawWriter;
 
-struct FileSpec {
+struct ReceiverFile {
   std::string file;
   std::string serial;
   double zenith_wet;
@@ -110,11 +110,11 @@ void WriteEphemerides(RawWriter& w, const Survey& s, double toe) {
   }
 }
 
-void WriteReceiverFile(const Survey& s, const FileSpec& spec, RawWriter& w) {
+void WriteReceiverFile(const Survey& s, const ReceiverFile& rf, RawWriter& w) {
   const SurveyOptions& o = s.options;
-  ReceiverSim rx(spec.seed, o.start, spec.zenith_wet);
+  ReceiverSim rx(rf.seed, o.start, rf.zenith_wet);
   w.Header('O');
-  w.Receiver("voxsim", "simulated survey", spec.serial, "SIMRX", "1.0");
+  w.Receiver("voxsim", "simulated survey", rf.serial, "SIMRX", "1.0");
   size_t next_toe = 0;
   int64_t day = -1;
   for (size_t k = 0; k < s.EpochCount(); ++k) {
@@ -130,7 +130,7 @@ void WriteReceiverFile(const Survey& s, const FileSpec& spec, RawWriter& w) {
         WriteEphemerides(w, s, s.toes[next_toe]);
       ++next_toe;
     }
-    const Vec3 antenna = spec.moving ? s.KinematicAt(t) : spec.station->Antenna();
+    const Vec3 antenna = rf.moving ? s.KinematicAt(t) : rf.station->Antenna();
     std::vector<voxtools::RawSatellite> sats;
     for (const SimSatellite& sat : s.satellites) {
       Observables ob;
@@ -213,15 +213,15 @@ std::string WriteSurvey(const Survey& s) {
   Random rng(s.options.seed ^ 0x7265636569766572ull);
   // The wet troposphere of nearby places differs by a centimetre or so, not by decimetres.
   const double wet = rng.Uniform(0.05, 0.2);
-  const FileSpec specs[] = {
+  const ReceiverFile files[] = {
       {"base.raw", "1001", wet, rng.Next(), false, &s.base},
       {"rover.raw", "1002", wet + rng.Uniform(-0.01, 0.01), rng.Next(), false, &s.rover},
       {"kinematic.raw", "1003", wet + rng.Uniform(-0.01, 0.01), rng.Next(), true, nullptr},
   };
-  for (const FileSpec& spec : specs) {
+  for (const ReceiverFile& rf : files) {
     RawWriter w(s.options.order);
-    WriteReceiverFile(s, spec, w);
-    if (!w.Save((dir / spec.file).string())) return "cannot write " + (dir / spec.file).string();
+    WriteReceiverFile(s, rf, w);
+    if (!w.Save((dir / rf.file).string())) return "cannot write " + (dir / rf.file).string();
   }
   std::ofstream job(dir / "survey.job"), truth(dir / "truth.txt");
   WriteJob(s, job);
