@@ -30,7 +30,7 @@ bool RunEngineStep(TTask& task) {
 
 void BreakCheck(TTask& task) {
   if (TheRun().break_flag.load() != 1) return;
-  TEngine* engine = task.current_engine;
+  TEngine* engine = task.current_engine.load();
   if (engine != nullptr && engine->loaded()) engine->BreakProcess();
 }
 

@@ -15,6 +15,7 @@
 //   writing through the task's writer) without a lock.
 #pragma once
 
+#include <atomic>
 #include <cstdint>
 #include <memory>
 #include <unordered_set>
@@ -41,8 +42,9 @@ struct TTask {
   JobModel job;
   // The engines the parser loaded through this binder.
   std::unique_ptr<JobEngines> engines = std::make_unique<JobEngines>();
-  // The engine being run; a break calls its _eng_BreakProcess. Null outside engine calls.
-  TEngine* current_engine = nullptr;
+  // The engine being run; a break calls its _eng_BreakProcess from whichever thread calls
+  // back. Set by the job thread; null outside engine calls.
+  std::atomic<TEngine*> current_engine{nullptr};
   // Satellite stores and meteorological tracks, filled by the raw file scans of data
   // preparation and only read afterwards.
   EphemerisStore ephemerides;
