@@ -118,6 +118,14 @@ TEST_F(RunApiTest, FailuresEndWithTheirExitCodes) {
                                         "[POINT1]\nName=A\nResultPath=nojob.res\n")),
             6u);
   EXPECT_FALSE(std::filesystem::exists(scratch_.File("nojob.res")));
+  // 6: an engine that cannot be loaded; the result file is not created either.
+  SetUp();
+  EXPECT_EQ(RunJob(vox::test::WriteFile(
+                scratch_.File("noengine.job"),
+                vox::test::JobText("E", "noengine.res", "Type=1\nEnginePath=./absent.eng\n"))),
+            6u);
+  EXPECT_FALSE(std::filesystem::exists(scratch_.File("noengine.res")));
+  EXPECT_NE(temp_.EngineLogTexts().back().find("Can not parse input file\n"), std::string::npos);
   // 7: the result file's folder does not exist.
   SetUp();
   EXPECT_EQ(RunJob(vox::test::WriteFile(scratch_.File("nofolder.job"),
