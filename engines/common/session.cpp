@@ -1,0 +1,98 @@
+#include "session.h"
+
+#include <algorithm>
+
+#include "combinations.h"
+#include "point_solution.h"
+
+namespace voxeng::io {
+
+namespace {
+
+bool SameTime(const TimeMs& a, const TimeMs& b) {
+  return a.seconds == b.seconds && a.ms == b.ms;
+}
+bool Before(const TimeMs& a, const TimeMs& b) {
+  return a.seconds < b.seconds || (a.seconds == b.seconds && a.ms < b.ms);
+}
+
+}  // namespace
+
+bool Overlap(const Occupation& a, const Occupation& b, TimeMs& from, TimeMs& to) {
+  if (a.epochs == 0 || b.epochs == 0) return false;
+  from = Before(a.first, b.first) ? b.first : a.first;
+  to = Before(a.last, b.last) ? a.last : b.last;
+  return Seconds(to) - Seconds(from) >= 1.0;
+}
+
+std::vector<DdEpoch> PairEpochs(const std::vector<EpochObs>& base,
+                                const std::vector<EpochObs>& rover, const Ephemerides& eph) {
+  std::vector<DdEpoch> out;
+  size_t j = 0;
+  for (const EpochObs& b : base) {
+    while (j < rover.size() && Before(rover[j].time, b.time))
+      ++j;
+    if (j == rover.size()) break;
+    if (!SameTime(rover[j].time, b.time)) continue;
+    const EpochObs& r = rover[j];
+    DdEpoch dd;
+    dd.t_base = b.t;
+    dd.t_rover = r.t;
+    for (const SatObs& sb : b.sats) {
+      const auto sr = std::find_if(r.sats.begin(), r.sats.end(),
+                                   [&](const SatObs& s) { return s.prn == sb.prn; });
+      if (sr == r.sats.end()) continue;
+      const vox_GpsOrbitParams* orbit = eph.Find(sb.prn, b.t);
+      if (orbit == nullptr) continue;
+      const bool phase = sb.l1 != 0 && sr->l1 != 0;
+      dd.sats.push_back({sb.prn, orbit, sb.p1, sr->p1, phase ? sb.l1 : 0.0, phase ? sr->l1 : 0.0,
+                         sb.slip || sr->slip});
+    }
+    out.push_back(std::move(dd));
+  }
+  return out;
+}
+
+std::optional<Vec3> MeanPointPosition(const std::vector<EpochObs>& epochs, const Ephemerides& eph,
+                                      size_t step) {
+  Vec3 sum{};
+  size_t count = 0;
+  Vec3 start{};
+  for (size_t k = 0; k < epochs.size(); k += std::max<size_t>(step, 1)) {
+    const EpochObs& e = epochs[k];
+    std::vector<RangeObservation> obs;
+    bool dual = true;
+    for (const SatObs& s : e.sats)
+      if (eph.Find(s.prn, e.t) && s.p2 == 0) dual = false;
+    for (const SatObs& s : e.sats)
+      if (const vox_GpsOrbitParams* orbit = eph.Find(s.prn, e.t))
+        obs.push_back({s.prn, orbit, dual ? IonoFree(s.p1, s.p2) : s.p1, dual});
+    PointOptions options;
+    options.initial = start;
+    const PointSolution sol = SolvePoint(e.t, obs, options);
+    if (!sol.ok) continue;
+    start = sol.position;
+    sum = sum + sol.position;
+    ++count;
+  }
+  if (count == 0) return std::nullopt;
+  return (1.0 / count) * sum;
+}
+
+std::optional<BasePosition> ResolveBase(const Occupation& occupation,
+                                        const std::vector<EpochObs>& epochs,
+                                        const Ephemerides& eph) {
+  if (const auto p = PointPosition(occupation.point_id)) {
+    const char* source = p->site_type == VOX_SITE_KNOWN    ? "known"
+                         : p->site_type == VOX_SITE_SOLVED ? "solved"
+                                                           : "navigation mean";
+    return BasePosition{p->xyz, p->rms, source};
+  }
+  if (const auto nav = NavCoord(occupation.id)) return BasePosition{*nav, 0, "navigation"};
+  const size_t step = std::max<size_t>(1, epochs.size() / 60);
+  if (const auto antenna = MeanPointPosition(epochs, eph, step))
+    return BasePosition{MarkOf(*antenna, occupation), 0, "single-point"};
+  return std::nullopt;
+}
+
+}  // namespace voxeng::io

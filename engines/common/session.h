@@ -1,0 +1,37 @@
+// A session of two receivers, as the differential engines set it up: the time both
+// occupations cover, the base position to start from, and the epochs of both joined into
+// double-difference epochs.
+#pragma once
+
+#include <optional>
+#include <string>
+#include <vector>
+
+#include "double_difference.h"
+#include "sdk_io.h"
+
+namespace voxeng::io {
+
+// The span both occupations cover; false when they do not overlap by at least one second.
+bool Overlap(const Occupation& a, const Occupation& b, TimeMs& from, TimeMs& to);
+
+// Epochs of equal time tag, with every satellite both receivers saw and an orbit exists for.
+std::vector<DdEpoch> PairEpochs(const std::vector<EpochObs>& base,
+                                const std::vector<EpochObs>& rover, const Ephemerides& eph);
+
+// The mean single-point antenna position of some epochs (every `step`-th), if any solves.
+std::optional<Vec3> MeanPointPosition(const std::vector<EpochObs>& epochs, const Ephemerides& eph,
+                                      size_t step);
+
+// Where a base stands: the point's known (or solved, or navigation mean) position, else the
+// occupation's navigation coordinates, else a single-point mean of its epochs.
+struct BasePosition {
+  Vec3 mark{};
+  double rms = 0;
+  std::string source;  // "known", "solved", "navigation mean", "navigation", "single-point"
+};
+std::optional<BasePosition> ResolveBase(const Occupation& occupation,
+                                        const std::vector<EpochObs>& epochs,
+                                        const Ephemerides& eph);
+
+}  // namespace voxeng::io
