@@ -26,6 +26,7 @@
 #include <array>
 #include <cmath>
 #include <cstdio>
+#include <cstdlib>
 #include <filesystem>
 #include <fstream>
 #include <optional>
@@ -495,13 +496,22 @@ int Run(const Options& o) {
     }
     const auto interval_ms = static_cast<int64_t>(std::llround(o.interval * 1000.0));
     int64_t reference_day = -1;
+    int64_t last_grid = -1;
     EpochConverter converter(obs);
     rinex::ObsEpoch epoch;
     while (obs.Next(epoch)) {
       const double t = rinex::SecondsSinceGpsOrigin(epoch.time);
       const int64_t ms = std::llround((t + ToGpsTime(obs.header(), t, leap)) * 1000.0);
       if (ms < 0) throw RinexError(o.obs, epoch.line, "epoch before 1980-01-06");
-      if (interval_ms > 0 && ms % interval_ms != 0) continue;
+      if (interval_ms > 0) {
+        // Receivers that steer their clock date epochs a millisecond or so off the second;
+        // an epoch belongs to the nearest grid point within 0.1 s, and each point takes the
+        // first epoch that comes to it.
+        const int64_t grid = (ms + interval_ms / 2) / interval_ms * interval_ms;
+        if (std::llabs(ms - grid) > std::min<int64_t>(100, interval_ms / 2) || grid <= last_grid)
+          continue;
+        last_grid = grid;
+      }
       std::vector<voxtools::RawSatellite> sats;
       for (const rinex::SatObservations& s : epoch.sats) {
         voxtools::RawSatellite raw;
@@ -569,7 +579,7 @@ void AddFromRinex(CLI::App& app) {
   cmd->add_flag("--big-endian", options->big_endian, "write the big-endian byte order");
   cmd->add_option("--interval", options->interval,
                   "keep only epochs on this grid (seconds, counted from the GPS time origin)")
-      ->check(CLI::NonNegativeNumber);
+      ->check(CLI::NonNegativeNumber);  // epochs within 0.1 s of a grid point are kept
   cmd->add_flag("--position", options->position,
                 "print the header's approximate position as PosX=, PosY=, PosZ= lines");
   cmd->callback([options]() {
