@@ -1,6 +1,7 @@
 #include "session.h"
 
 #include <algorithm>
+#include <cmath>
 
 #include "combinations.h"
 #include "point_solution.h"
@@ -93,6 +94,17 @@ std::optional<BasePosition> ResolveBase(const Occupation& occupation,
   if (const auto antenna = MeanPointPosition(epochs, eph, step))
     return BasePosition{MarkOf(*antenna, occupation), 0, "single-point"};
   return std::nullopt;
+}
+
+double ReportedRms(const SymMatrix& covariance, size_t epochs, double span_seconds, bool phase,
+                   double length) {
+  constexpr double kCorrelationSeconds = 300.0;
+  const double trace = covariance(0, 0) + covariance(1, 1) + covariance(2, 2);
+  const double independent =
+      std::clamp(span_seconds / kCorrelationSeconds + 1.0, 1.0, std::max(1.0, double(epochs)));
+  double variance = std::max(trace, 0.0) * std::max(1.0, epochs / independent);
+  if (phase) variance += 0.015 * 0.015 + (1e-6 * length) * (1e-6 * length);
+  return std::sqrt(variance);
 }
 
 }  // namespace voxeng::io

@@ -34,4 +34,12 @@ std::optional<BasePosition> ResolveBase(const Occupation& occupation,
                                         const std::vector<EpochObs>& epochs,
                                         const Ephemerides& eph);
 
+// The rms (m) to report for a differential position. The formal covariance of many epochs
+// is far too optimistic: epochs close in time share their errors (multipath, atmosphere), so
+// the covariance is scaled as if one epoch in five minutes were independent. Phase solutions
+// also carry what no double difference removes: the troposphere difference of two sites and
+// the orbit error, a centimetre and a half plus a part per million of the length.
+double ReportedRms(const SymMatrix& covariance, size_t epochs, double span_seconds, bool phase,
+                   double length);
+
 }  // namespace voxeng::io

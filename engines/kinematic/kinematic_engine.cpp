@@ -139,7 +139,7 @@ class FanSolver {
   }
 
   bool Solve(const io::BasePosition& base, const std::vector<DdEpoch>& epochs) {
-    const Vec3 base_antenna = io::AntennaOf(base.mark, base_);
+    const Vec3 base_antenna = base_antenna_ = io::AntennaOf(base.mark, base_);
     // Code positions epoch by epoch, each starting from the one before.
     std::vector<BaselineSolution> code(epochs.size());
     std::vector<Vec3> approx(epochs.size(), base_antenna);
@@ -215,7 +215,8 @@ class FanSolver {
         ray.position[c] = mark[c];
       ray.values[0] = static_cast<uint32_t>(code[k].ok ? code[k].observations : 0);
       ray.values[1] = static_cast<uint32_t>(phase.reference_sat);
-      ray.values[2] = static_cast<uint32_t>(std::min(Rms(cov) * 1000.0, 4.0e9));
+      const double rms = io::ReportedRms(cov, 1, 0, kind != kCode, Norm(antenna - base_antenna_));
+      ray.values[2] = static_cast<uint32_t>(std::min(rms * 1000.0, 4.0e9));
       ray.flags = kind;
       ray.hdop = static_cast<float>(Hdop(antenna, sats, 0.0));
       ray.satellites = static_cast<uint32_t>(epochs[k].sats.size());
@@ -232,6 +233,7 @@ class FanSolver {
   io::Occupation base_, rover_;
   TimeMs from_{}, to_{};
   io::Ephemerides eph_;
+  Vec3 base_antenna_{};
 };
 
 uint32_t RunGroup(vox_ThreadContext* context) {

@@ -171,7 +171,9 @@ class VectorSolver {
              const std::vector<DdEpoch>& epochs) {
     const Vec3 rover_mark = io::MarkOf(s.rover, rover_);
     const Vec3 baseline = rover_mark - base.mark;
-    const double rms = Rms(s.covariance);
+    const double rms =
+        io::ReportedRms(s.covariance, epochs.size(), epochs.back().t_base - epochs.front().t_base,
+                        kind != kCode, Norm(baseline));
     vox_VectorResult r;
     std::memset(&r, 0, sizeof r);
     r.solved = 1;

@@ -7,10 +7,12 @@
 #include <chrono>
 #include <cmath>
 #include <cstdlib>
+#include <sstream>
 #include <string>
 #include <thread>
 #include <variant>
 
+#include "demo_report.h"
 #include "result_reader.h"
 #include "support/scratch.h"
 #include "survey.h"
@@ -123,6 +125,16 @@ TEST_F(ReferenceJobs, StaticJobFindsTheEnginesByDefaultName) {
   ASSERT_EQ(vectors.size(), 1u);
   const Vec3 got{vectors[0].baseline[0], vectors[0].baseline[1], vectors[0].baseline[2]};
   EXPECT_LT(voxeng::Norm(got - (survey_.rover.mark - survey_.base.mark)), 0.02);
+
+  // The demo's report names the solution and measures it against the truth file.
+  voxdemo::Truth truth;
+  ASSERT_TRUE(voxdemo::ReadTruth(folder_ + "/truth.txt", truth));
+  std::ostringstream report;
+  EXPECT_TRUE(voxdemo::Report(out.file, truth, {folder_ + "/none.gga"}, report));
+  EXPECT_NE(report.str().find("vector 1: fixed"), std::string::npos) << report.str();
+  EXPECT_NE(report.str().find("truth BASE -> ROVER: difference 0.0"), std::string::npos);
+  EXPECT_NE(report.str().find("occupation 1 (BASE): navigation position"), std::string::npos);
+  EXPECT_NE(report.str().find("none.gga: not written"), std::string::npos);
 }
 
 TEST_F(ReferenceJobs, KinematicJobWritesRaysAndTheirNmea) {
