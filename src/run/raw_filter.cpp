@@ -67,9 +67,10 @@ uint32_t WorkerMain(void* argument) {
 
 class WorkerPool {
  public:
-  WorkerPool(TTask& task, TEngine& raw_filter)
+  WorkerPool(TTask& task, TEngine& raw_filter, StartWorkerFn start_worker)
       : task_(task),
         raw_filter_(raw_filter),
+        start_worker_(start_worker),
         count_(std::min(task.thread_count(), kMaxRawFilterWorkers)) {}
 
   // Hands the occupations to free slots in list order until they are all started or a
@@ -136,7 +137,7 @@ class WorkerPool {
     slot.occupation = &occupation;
     slot.running.store(true, std::memory_order_release);
     InitNewThread(task_, &slot.context);
-    slot.thread = platform::StartThread(WorkerMain, &slot, kRawFilterWorkerStack);
+    slot.thread = start_worker_(WorkerMain, &slot, kRawFilterWorkerStack);
     if (slot.thread) return;
     // No thread runs for this slot: free it at once, or the drain would wait for it forever.
     // The occupation goes unprocessed.
@@ -155,6 +156,7 @@ class WorkerPool {
 
   TTask& task_;
   TEngine& raw_filter_;
+  const StartWorkerFn start_worker_;
   const uint32_t count_;
   std::array<WorkerSlot, kMaxRawFilterWorkers> slots_;
 };
@@ -177,10 +179,10 @@ bool RunRawFilterSingle(TTask& task, TEngine& raw_filter) {
   return true;
 }
 
-bool RunRawFilterMulti(TTask& task, TEngine& raw_filter) {
+bool RunRawFilterMulti(TTask& task, TEngine& raw_filter, StartWorkerFn start_worker) {
   task.current_engine.store(&raw_filter);
   {
-    auto pool = std::make_unique<WorkerPool>(task, raw_filter);
+    auto pool = std::make_unique<WorkerPool>(task, raw_filter, start_worker);
     pool->Dispatch();
     pool->Drain();
   }

@@ -13,6 +13,9 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
+
+#include "platform/platform.h"
 
 namespace vox {
 
@@ -29,9 +32,15 @@ constexpr size_t kRawFilterWorkerStack = 0x10000;
 // Occupations one by one on the job thread, stopping at a break (checked before each).
 // Always true.
 bool RunRawFilterSingle(TTask& task, TEngine& raw_filter);
+// How a worker thread is started; platform::StartThread but in tests.
+using StartWorkerFn = std::unique_ptr<platform::Thread> (*)(platform::ThreadProc proc,
+                                                            void* argument, size_t stack_bytes);
+
 // Occupations on min(thread count, 32) worker threads; dispatch stops at a break, and every
-// worker started is collected before it returns. Always true.
-bool RunRawFilterMulti(TTask& task, TEngine& raw_filter);
+// worker started is collected before it returns. An occupation whose worker cannot be started
+// is not processed (an engine-log line says so). Always true.
+bool RunRawFilterMulti(TTask& task, TEngine& raw_filter,
+                       StartWorkerFn start_worker = platform::StartThread);
 
 // Writes occupation's record to writer under the task's solution lock; true when written.
 bool WriteOccupationRecordLocked(TTask& task, TResultFile& writer, const TOccupItem& occupation);

@@ -11,8 +11,10 @@
 #include <string>
 #include <vector>
 
+#include "engine/engine.h"
 #include "run/engine_steps.h"
 #include "run/job_parse.h"
+#include "run/raw_filter.h"
 #include "run/run_state.h"
 #include "run/task.h"
 #include "support/scratch.h"
@@ -227,6 +229,34 @@ TEST_F(EngineStepsTest, ARawFilterThatCannotBeLoadedFailsTheStepWithItsMessages)
       Prepare(test::JobText("Sched", result_, "RawfiltPath=" + scratch_.File("none.dll") + "\n")));
   EXPECT_FALSE(RunRawFilterStep(task_));
   EXPECT_EQ(Finish(), (std::vector<std::string>{"msg RawFilter", "msg RawFilter - OK", "msg "}));
+}
+
+// Starts every second worker it is asked for; the others "cannot be created".
+std::unique_ptr<platform::Thread> StartEverySecond(platform::ThreadProc proc, void* argument,
+                                                   size_t stack_bytes) {
+  static int calls = 0;
+  if (++calls % 2 == 0) return nullptr;
+  return platform::StartThread(proc, argument, stack_bytes);
+}
+
+std::unique_ptr<platform::Thread> StartNone(platform::ThreadProc, void*, size_t) {
+  return nullptr;
+}
+
+TEST_F(EngineStepsTest, AWorkerThatCannotBeStartedCostsItsOccupationAndDoesNotHangTheRun) {
+  ASSERT_TRUE(Prepare(Job(6, "NumCPUs=2\n")));
+  std::unique_ptr<TEngine> raw_filter;
+  LoadEngineInto(raw_filter, ENGINE_DIR "test_schedule.eng");
+  ASSERT_TRUE(raw_filter->loaded());
+  EXPECT_TRUE(RunRawFilterMulti(task_, *raw_filter, StartEverySecond));
+  EXPECT_TRUE(RunRawFilterMulti(task_, *raw_filter, StartNone));
+  EXPECT_TRUE(task_.thread_writers.empty());
+  EXPECT_TRUE(temp_.TempFiles("VOX").empty());
+  const std::vector<std::string> records = Finish();
+  EXPECT_EQ(std::count_if(records.begin(), records.end(),
+                          [](const std::string& r) { return r.rfind("occ ", 0) == 0; }),
+            3);
+  EXPECT_EQ(CallsOf("occ ").size(), 3u);
 }
 
 // ---------------------------------------------------------------- the engine step
