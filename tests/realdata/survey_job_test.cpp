@@ -1,0 +1,138 @@
+// A real survey through the whole system: the RINEX files of stations 0759 and 3040 (one hour,
+// 30 s, about 3.3 km apart) converted with voxraw from-rinex, a static job with 0759 as the
+// known point (its RINEX header position) and 3040 unknown, run by voxrun with the reference
+// raw filter and static engine. The results must agree with the stations' header positions.
+#include <gtest/gtest.h>
+#include <sys/wait.h>
+
+#include <array>
+#include <cmath>
+#include <cstdio>
+#include <fstream>
+#include <memory>
+#include <variant>
+
+#include "realdata.h"
+#include "result_reader.h"
+#include "support/scratch.h"
+
+namespace vox::test {
+namespace {
+
+using Xyz = std::array<double, 3>;
+
+// From the RINEX headers (APPROX POSITION XYZ).
+constexpr Xyz k0759 = {-3976219.5082, 3382372.5671, 3652512.9849};
+constexpr Xyz k3040 = {-3978242.4348, 3382841.1715, 3649902.7667};
+
+std::string JobFile(const std::string& base_raw, const std::string& rover_raw) {
+  char point[160];
+  std::snprintf(point, sizeof point, "PosX=%.4f\nPosY=%.4f\nPosZ=%.4f\n", k0759[0], k0759[1],
+                k0759[2]);
+  return "[JOB]\nName=Real data 0759-3040\nType=1\nResultPath=result.bin\nNumFiles=2\n"
+         "NumPoints=2\nNumOccups=2\nNumVectors=1\nNumAntennas=1\nNumReceivers=1\n"
+         "[FILE:1]\nName=" +
+         base_raw + "\n[FILE:2]\nName=" + rover_raw +
+         "\n"
+         "[POINT:1]\nName=0759\n" +
+         point +
+         "Type=0\n"
+         "[POINT:2]\nName=3040\n"
+         "[ANTENNA:1]\nName=TRM29659.00\n"
+         "[RECEIVER:1]\nVendor=TRIMBLE\nName=5700\n"
+         "[OCCUP:1]\nFile=1\nPoint=1\nAntenna=1\nReceiver=1\n"
+         "[OCCUP:2]\nFile=2\nPoint=2\nAntenna=1\nReceiver=1\n"
+         "[VECTOR:1]\nPoints=1,2\n";
+}
+
+// The job is run once for all tests of the suite.
+class SurveyJob : public ::testing::Test {
+ protected:
+  struct Run {
+    ScratchDir scratch;
+    std::string convert_errors;
+    int exit_code = -1;
+    std::string voxrun_output;
+    tools::ReadResult result;
+  };
+
+  static void SetUpTestSuite() {
+    if (GnssDir().empty()) return;
+    run_ = std::make_unique<Run>();
+    const std::string dir = run_->scratch.path().string();
+    // The rover's file in the other byte order: the job mixes both.
+    const ToolRun a = RunVoxraw({"from-rinex", GnssDir() + "/07590920.05o",
+                                 GnssDir() + "/07590920.05n", "-o", dir + "/0759.raw"},
+                                dir);
+    const ToolRun b =
+        RunVoxraw({"from-rinex", GnssDir() + "/30400920.05o", GnssDir() + "/30400920.05n", "-o",
+                   dir + "/3040.raw", "--big-endian"},
+                  dir);
+    run_->convert_errors = a.err + b.err;
+    if (a.exit_code != 0 || b.exit_code != 0) return;
+    WriteFile(dir + "/job.ini", JobFile("0759.raw", "3040.raw"));
+    const std::string command = std::string("'") + VOXRUN_PATH + "' --quiet '" + dir +
+                                "/job.ini' >'" + dir + "/voxrun.out' 2>&1";
+    const int status = std::system(command.c_str());
+    run_->exit_code = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+    run_->voxrun_output = ReadFile(dir + "/voxrun.out");
+    run_->result = tools::ReadResultFile(dir + "/result.bin");
+  }
+  static void TearDownTestSuite() { run_.reset(); }
+
+  void SetUp() override {
+    REQUIRE_GNSS_DATA();
+#ifndef VOX_REFERENCE_ENGINES
+    GTEST_SKIP() << "the reference engines (kra_rawfilter.dll, kra_static.eng) are not part of "
+                    "this build";
+#endif
+    ASSERT_TRUE(run_->convert_errors.empty()) << run_->convert_errors;
+    ASSERT_EQ(run_->exit_code, 0) << run_->voxrun_output;
+    ASSERT_FALSE(run_->result.fault) << run_->result.fault->what;
+  }
+
+  template <typename T>
+  static std::vector<T> Records() {
+    std::vector<T> out;
+    for (const tools::Record& r : run_->result.records)
+      if (const T* body = std::get_if<T>(&r.body)) out.push_back(*body);
+    return out;
+  }
+
+  static std::unique_ptr<Run> run_;
+};
+
+std::unique_ptr<SurveyJob::Run> SurveyJob::run_;
+
+TEST_F(SurveyJob, MeanSinglePointPositionOfEachStationLiesWithinTenMetresOfItsHeader) {
+  const auto occupations = Records<tools::OccupationRec>();
+  ASSERT_EQ(occupations.size(), 2u);
+  for (const tools::OccupationRec& o : occupations) {
+    const Xyz& header = o.occupation == 1 ? k0759 : k3040;
+    const Xyz nav = {o.nav[0], o.nav[1], o.nav[2]};
+    const double off = Distance(nav, header);
+    std::printf("occupation %u (%s): %u epochs, navigation position %.2f m from the header\n",
+                o.occupation, o.point_name.c_str(), o.epochs, off);
+    EXPECT_EQ(o.epochs, 120u);
+    EXPECT_LT(off, 10.0) << o.point_name;
+  }
+}
+
+TEST_F(SurveyJob, StaticBaselineAgreesWithTheHeaderPositions) {
+  const auto vectors = Records<tools::VectorRec>();
+  ASSERT_EQ(vectors.size(), 1u);
+  const tools::VectorRec& v = vectors[0];
+  const Xyz expected = {k3040[0] - k0759[0], k3040[1] - k0759[1], k3040[2] - k0759[2]};
+  const Xyz got = {v.baseline[0], v.baseline[1], v.baseline[2]};
+  const double off = Distance(got, expected);
+  const unsigned kind = v.flags & 3u;  // 1 fixed phase, 2 float phase, 3 code only
+  const char* names[] = {"unsolved", "fixed carrier phase", "float carrier phase", "code"};
+  std::printf("baseline 0759 -> 3040: %s solution, %.3f m from the header difference\n",
+              names[kind], off);
+  RecordProperty("baseline_offset_m", std::to_string(off));
+  EXPECT_NE(kind, 0u);
+  EXPECT_LT(off, 0.5);
+}
+
+}  // namespace
+}  // namespace vox::test
