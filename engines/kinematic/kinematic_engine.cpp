@@ -20,6 +20,7 @@
 #include <vector>
 
 #include "broadcast.h"
+#include "dd_params.h"
 #include "dop.h"
 #include "session.h"
 
@@ -77,6 +78,8 @@ class FanSolver {
       : f_(f), report_(report), done_(done), total_(total) {}
 
   bool Run() {
+    params_ = ItemDdParams(vox_GetFanProperty, f_.id);
+    options_.elevation_mask = params_.elevation_mask_deg * kDeg;
     std::vector<io::Occupation> bases, rovers;
     void* stream = vox_OpenROccupStream(f_.id, 0);
     if (stream != nullptr) {
@@ -97,8 +100,8 @@ class FanSolver {
 
     eph_.Load(from_.seconds, to_.seconds + 1);
     if (eph_.Empty()) return Fail("no GPS broadcast ephemeris for the common span");
-    const auto base_epochs = io::ReadEpochs(base_.id, 0, &from_, &to_, g_stop);
-    const auto rover_epochs = io::ReadEpochs(rover_.id, 0, &from_, &to_, g_stop);
+    const auto base_epochs = io::ReadEpochs(base_.id, params_.interval_ms, &from_, &to_, g_stop);
+    const auto rover_epochs = io::ReadEpochs(rover_.id, params_.interval_ms, &from_, &to_, g_stop);
     if (g_stop.Requested()) return Fail("stopped on request");
     const auto base = io::ResolveBase(base_, base_epochs, eph_);
     if (!base) return Fail("no position for the base point");
@@ -147,7 +150,7 @@ class FanSolver {
     if (const auto nav = io::NavCoord(rover_.id)) start = io::AntennaOf(*nav, rover_);
     size_t code_ok = 0;
     for (size_t k = 0; k < epochs.size() && !g_stop.Requested(); ++k) {
-      code[k] = SolveCodeBaseline(std::span(&epochs[k], 1), base_antenna, start);
+      code[k] = SolveCodeBaseline(std::span(&epochs[k], 1), base_antenna, start, options_);
       if (code[k].ok) {
         start = approx[k] = code[k].rover;
         ++code_ok;
@@ -156,7 +159,8 @@ class FanSolver {
     if (g_stop.Requested()) return Fail("stopped on request");
     if (code_ok == 0) return Fail("too few satellites in common at every epoch");
     Progress(50);
-    const KinematicSolution phase = SolveKinematicPhase(epochs, base_antenna, approx);
+    const KinematicSolution phase =
+        SolveKinematicPhase(epochs, base_antenna, approx, options_, params_.min_ratio);
     if (g_stop.Requested()) return Fail("stopped on request");
     Progress(80);
 
@@ -233,6 +237,8 @@ class FanSolver {
   io::Occupation base_, rover_;
   TimeMs from_{}, to_{};
   io::Ephemerides eph_;
+  DdParams params_{};
+  DdOptions options_;
   Vec3 base_antenna_{};
 };
 
@@ -279,6 +285,23 @@ VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetEngineCapability(void) {
 }
 VOX_ENGINE_EXPORT const char* VOX_CALL _eng_GetEngineDescription(void) {
   return "Kinematic GPS positions of a rover file against a base (code, float and fixed phase)";
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetParamBlockSize(void) {
+  return sizeof(DdParams);
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_InitParamBlock(ParameterBlock* block) {
+  if (block == nullptr || block->allocated < sizeof(DdParams)) return 0;
+  InitDdParams(*reinterpret_cast<DdParams*>(block));
+  return 1;
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_EnumParamName(vox_EnumParamCallback callback,
+                                                       void* context) {
+  EnumDdParams(callback, context);
+  return 1;
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_SetParam(ParameterBlock* block, const char* name,
+                                                  const char* value) {
+  return SetDdParam(block, name, value) ? 1 : 0;
 }
 VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_BreakProcess(void) {
   g_stop.Request();

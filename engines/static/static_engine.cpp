@@ -24,6 +24,7 @@
 #include <thread>
 #include <vector>
 
+#include "dd_params.h"
 #include "session.h"
 
 namespace {
@@ -90,6 +91,8 @@ class VectorSolver {
 
   // Solves and stores the vector; false (with a message saying why) when it has no solution.
   bool Run() {
+    params_ = ItemDdParams(vox_GetVectorProperty, v_.id);
+    options_.elevation_mask = params_.elevation_mask_deg * kDeg;
     std::vector<io::Occupation> on[2];
     Occupations(v_, on);
     for (int k = 0; k < 2; ++k)
@@ -104,8 +107,8 @@ class VectorSolver {
 
     eph_.Load(from_.seconds, to_.seconds + 1);
     if (eph_.Empty()) return Fail("no GPS broadcast ephemeris for the common span");
-    const auto base_epochs = io::ReadEpochs(base_.id, 0, &from_, &to_, g_stop);
-    const auto rover_epochs = io::ReadEpochs(rover_.id, 0, &from_, &to_, g_stop);
+    const auto base_epochs = io::ReadEpochs(base_.id, params_.interval_ms, &from_, &to_, g_stop);
+    const auto rover_epochs = io::ReadEpochs(rover_.id, params_.interval_ms, &from_, &to_, g_stop);
     if (g_stop.Requested()) return Fail("stopped on request");
     const auto base = io::ResolveBase(base_, base_epochs, eph_);
     if (!base) return Fail("no position for the base point");
@@ -151,13 +154,14 @@ class VectorSolver {
     // solution converges from kilometres away.
     Vec3 start = base_antenna;
     if (const auto nav = io::NavCoord(rover_.id)) start = io::AntennaOf(*nav, rover_);
-    const BaselineSolution code = SolveCodeBaseline(epochs, base_antenna, start);
+    const BaselineSolution code = SolveCodeBaseline(epochs, base_antenna, start, options_);
     if (!code.ok) return Fail("too few satellites in common for a code solution");
     if (g_stop.Requested()) return Fail("stopped on request");
     report_.Progress(60);
     BaselineSolution best = code;
     uint32_t kind = kCode;
-    const BaselineSolution phase = SolvePhaseBaseline(epochs, base_antenna, code.rover);
+    const BaselineSolution phase =
+        SolvePhaseBaseline(epochs, base_antenna, code.rover, options_, params_.min_ratio);
     if (phase.ok && (phase.fixed || Rms(phase.covariance) < Rms(code.covariance))) {
       best = phase;
       kind = phase.fixed ? kFixed : kFloat;
@@ -215,6 +219,8 @@ class VectorSolver {
   io::Occupation base_, rover_;
   TimeMs from_{}, to_{};
   io::Ephemerides eph_;
+  DdParams params_{};
+  DdOptions options_;
 };
 
 // Solves vectors taken one by one from the shared index until none is left; reports the
@@ -302,6 +308,23 @@ VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetEngineCapability(void) {
 }
 VOX_ENGINE_EXPORT const char* VOX_CALL _eng_GetEngineDescription(void) {
   return "Static GPS baselines from double differences (code, float and fixed L1 phase)";
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetParamBlockSize(void) {
+  return sizeof(DdParams);
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_InitParamBlock(ParameterBlock* block) {
+  if (block == nullptr || block->allocated < sizeof(DdParams)) return 0;
+  InitDdParams(*reinterpret_cast<DdParams*>(block));
+  return 1;
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_EnumParamName(vox_EnumParamCallback callback,
+                                                       void* context) {
+  EnumDdParams(callback, context);
+  return 1;
+}
+VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_SetParam(ParameterBlock* block, const char* name,
+                                                  const char* value) {
+  return SetDdParam(block, name, value) ? 1 : 0;
 }
 VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_BreakProcess(void) {
   g_stop.Request();
