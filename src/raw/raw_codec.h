@@ -169,7 +169,7 @@ struct RawCodec {
     c.Array(r.velocity);
     c.Array(r.acceleration);
     r.unused65 = c.F64();
-    c.Array(r.unused73);
+    c.Skip(2);  // two bytes not used
     r.r3 = c.U8();
     r.r4 = c.U8();
     return c.Result();

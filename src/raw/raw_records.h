@@ -177,7 +177,6 @@ struct GlonassEphemerisRecord {
   float velocity[3] = {};      // km/s
   float acceleration[3] = {};  // km/s^2
   double unused65 = 0;
-  uint8_t unused73[2] = {};
   uint8_t r3 = 0, r4 = 0;
 };
 
