@@ -420,3 +420,49 @@ TEST(ScanC2, MeanAndOffsetAreLogged) {
 
 }  // namespace
 }  // namespace vox
+
+namespace vox {
+namespace {
+
+TEST(ScanRecords, RecordsFailingTheirChecksAreDroppedSilently) {
+  RawWriter w(RawOrder::kBig);
+  Start(w);
+  voxtools::RawGpsEphemeris g;
+  g.number = 9;
+  g.time = {0, kDay};
+  g.g8 = 300.0;  // at least 2^8
+  w.GpsEphemeris(g);
+  g.g8 = 0.0;
+  g.g20 = 1e-11;  // below 2^-33
+  w.GpsEphemeris(g);
+  voxtools::RawGlonassEphemeris r;
+  r.slot = 2;
+  r.position[1] = 300000.0;  // at least 2^18 km
+  w.GlonassEphemeris(r);
+  voxtools::RawSbasEphemeris s;
+  s.number = 41;  // out of range
+  w.SbasEphemeris(s);
+  w.SatPosition({SatCode51('G', 9), {0, kDay}, {3.0e5, 0, 0}, 0}, 56);  // X at least 2^28
+  w.SatPosition({static_cast<uint16_t>(7 << 6 | 1), {0, kDay}, {2e4, 0, 0}, 0}, 56);
+  w.SatPosition({SatCode8('G', 9), {0, kDay}, {2e4, 1e4, 0}, 0}, 23);  // kept
+  w.MeteoSample({{1000, kDay}, {}, 10.0f, {}, {}});
+  w.EndOfData();
+  ScanRun run;
+  run.Run(w);
+  EXPECT_EQ(run.status, kScanComplete);
+  EXPECT_EQ(run.ephemerides.Total(), 0u);
+  EXPECT_EQ(run.details.ephemerides_dropped, 4u);
+  EXPECT_EQ(run.details.positions_stored, 1u);
+  EXPECT_EQ(run.details.positions_dropped, 2u);
+  ASSERT_NE(run.meteo.head(), nullptr);
+  const vox_MeteoData& m = run.meteo.head()->first->data;
+  uint32_t bits;
+  std::memcpy(&bits, &m.pressure, 4);
+  EXPECT_EQ(bits, 0x447D4FBEu);  // the default pressure
+  EXPECT_EQ(m.temperature, 10.0f);
+  EXPECT_EQ(m.humidity, 50.0f);
+  EXPECT_EQ(run.meteo.head()->file_id, run.file->id);
+}
+
+}  // namespace
+}  // namespace vox
