@@ -59,6 +59,10 @@ struct Station {
   const char* receiver;
 };
 
+void PrintTo(const Station& s, std::ostream* os) {
+  *os << s.name;
+}
+
 class StationTest : public ::testing::TestWithParam<std::tuple<Station, bool>> {};
 
 // RINEX 2 types of these files and where the stream delivers them: value index 2s is the code
