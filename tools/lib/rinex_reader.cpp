@@ -64,7 +64,9 @@ constexpr int kLeapDates[][2] = {{1981, 7}, {1982, 7}, {1983, 7}, {1985, 7}, {19
 }  // namespace
 
 RinexError::RinexError(const std::string& file, int line, const std::string& what)
-    : std::runtime_error(file + ":" + std::to_string(line) + ": " + what), line_(line) {}
+    : std::runtime_error(file + (line > 0 ? ":" + std::to_string(line) : std::string()) + ": " +
+                         what),
+      line_(line) {}
 
 double SecondsSinceGpsOrigin(const RinexTime& t) {
   const int64_t days = DaysFromCivil(t.year, t.month, t.day) - kGpsOriginDays;

@@ -22,6 +22,7 @@
 
 namespace voxtools::rinex {
 
+// "file:line: what", or "file: what" for faults of the file as a whole (line 0).
 class RinexError : public std::runtime_error {
  public:
   RinexError(const std::string& file, int line, const std::string& what);

@@ -458,109 +458,137 @@ class Output {
   bool done_ = false;
 };
 
-struct Counts {
-  uint32_t epochs = 0, skipped_satellites = 0, ephemerides = 0, skipped_ephemerides = 0;
-};
-
-int Run(const Options& o) {
-  try {
-    ObsReader obs(o.obs);
-    std::vector<rinex::NavReader> navs;
-    std::optional<int> leap;
+// One conversion: the readers, the output and what was written.
+class Conversion {
+ public:
+  explicit Conversion(const Options& o)
+      : o_(o), obs_(o.obs), out_(o.out, o.big_endian ? RawOrder::kBig : RawOrder::kLittle) {
     for (const std::string& path : o.nav) {
-      navs.emplace_back(path);
-      if (!leap) leap = navs.back().header().leap_seconds;
+      navs_.emplace_back(path);
+      if (!leap_) leap_ = navs_.back().header().leap_seconds;
     }
-    if (!leap) leap = obs.header().leap_seconds;
-    Output out(o.out, o.big_endian ? RawOrder::kBig : RawOrder::kLittle);
-    Counts counts;
-    {
-      RawWriter w = out.Writer();
-      const rinex::ObsHeader& h = obs.header();
-      w.Header('O').Receiver(h.marker_name, h.agency, h.receiver_number, h.receiver_type,
-                             h.receiver_version);
-      out.Put(w);
-    }
-    for (rinex::NavReader& nav : navs) {
+    if (!leap_) leap_ = obs_.header().leap_seconds;
+  }
+
+  // Writes everything and gives the file its name; throws RinexError.
+  void Run() {
+    WriteHead();
+    WriteEphemerides();
+    WriteEpochs();
+    RawWriter w = out_.Writer();
+    w.EndOfData();
+    out_.Put(w);
+    out_.Commit();
+  }
+
+  void Report() {
+    std::printf("%s: %u epochs, %u ephemerides", o_.out.c_str(), epochs_, ephemerides_);
+    if (skipped_satellites_ || skipped_ephemerides_)
+      std::printf(
+          " (left out: %u satellite observations, %u ephemerides of satellites or "
+          "systems without a place in the raw records)",
+          skipped_satellites_, skipped_ephemerides_);
+    std::printf("\n");
+    if (!o_.position) return;
+    const auto& xyz = obs_.header().approx_position;
+    if (!xyz)
+      std::fprintf(stderr, "%s: the header gives no approximate position\n", o_.obs.c_str());
+    else
+      std::printf("PosX=%.4f\nPosY=%.4f\nPosZ=%.4f\n", (*xyz)[0], (*xyz)[1], (*xyz)[2]);
+  }
+
+ private:
+  void WriteHead() {
+    RawWriter w = out_.Writer();
+    const rinex::ObsHeader& h = obs_.header();
+    w.Header('O').Receiver(h.marker_name, h.agency, h.receiver_number, h.receiver_type,
+                           h.receiver_version);
+    out_.Put(w);
+  }
+
+  void WriteEphemerides() {
+    for (rinex::NavReader& nav : navs_) {
+      const std::optional<int> leap = nav.header().leap_seconds ? nav.header().leap_seconds : leap_;
       NavRecord r;
       while (nav.Next(r)) {
-        RawWriter w = out.Writer();
-        if (NavConverter(w, nav.header().leap_seconds ? nav.header().leap_seconds : leap)
-                .Convert(r)) {
-          out.Put(w);
-          ++counts.ephemerides;
+        RawWriter w = out_.Writer();
+        if (NavConverter(w, leap).Convert(r)) {
+          out_.Put(w);
+          ++ephemerides_;
         } else {
-          ++counts.skipped_ephemerides;
+          ++skipped_ephemerides_;
         }
       }
     }
-    const auto interval_ms = static_cast<int64_t>(std::llround(o.interval * 1000.0));
-    int64_t reference_day = -1;
-    int64_t last_grid = -1;
-    EpochConverter converter(obs);
+  }
+
+  // Receivers that steer their clock date epochs a millisecond or so off the second; an
+  // epoch belongs to the nearest grid point within 0.1 s, and each point takes the first
+  // epoch that comes to it.
+  bool OnGrid(int64_t ms) {
+    const auto interval = static_cast<int64_t>(std::llround(o_.interval * 1000.0));
+    if (interval <= 0) return true;
+    const int64_t grid = (ms + interval / 2) / interval * interval;
+    if (std::llabs(ms - grid) > std::min<int64_t>(100, interval / 2) || grid <= last_grid_)
+      return false;
+    last_grid_ = grid;
+    return true;
+  }
+
+  void WriteEpochs() {
+    EpochConverter converter(obs_);
     rinex::ObsEpoch epoch;
-    while (obs.Next(epoch)) {
+    while (obs_.Next(epoch)) {
       const double t = rinex::SecondsSinceGpsOrigin(epoch.time);
-      const int64_t ms = std::llround((t + ToGpsTime(obs.header(), t, leap)) * 1000.0);
-      if (ms < 0) throw RinexError(o.obs, epoch.line, "epoch before 1980-01-06");
-      if (interval_ms > 0) {
-        // Receivers that steer their clock date epochs a millisecond or so off the second;
-        // an epoch belongs to the nearest grid point within 0.1 s, and each point takes the
-        // first epoch that comes to it.
-        const int64_t grid = (ms + interval_ms / 2) / interval_ms * interval_ms;
-        if (std::llabs(ms - grid) > std::min<int64_t>(100, interval_ms / 2) || grid <= last_grid)
-          continue;
-        last_grid = grid;
-      }
+      const int64_t ms = std::llround((t + ToGpsTime(obs_.header(), t, leap_)) * 1000.0);
+      if (ms < 0) throw RinexError(o_.obs, epoch.line, "epoch before 1980-01-06");
+      if (!OnGrid(ms)) continue;
       std::vector<voxtools::RawSatellite> sats;
       for (const rinex::SatObservations& s : epoch.sats) {
         voxtools::RawSatellite raw;
         if (converter.Convert(s, raw))
           sats.push_back(std::move(raw));
         else
-          ++counts.skipped_satellites;
+          ++skipped_satellites_;
       }
-      if (sats.empty()) continue;
-      if (sats.size() > 255) throw RinexError(o.obs, epoch.line, "more than 255 satellites");
-      RawWriter w = out.Writer();
-      const int64_t day = ms / 86400000;
-      if (day != reference_day) {
-        // Epochs carry only the milliseconds of their day: a new day needs a new reference.
-        std::optional<uint32_t> leap_field;
-        if (leap) leap_field = static_cast<uint32_t>(*leap);
-        w.TimeRef("GPS", {0, static_cast<uint32_t>(day)}, {}, leap_field);
-        reference_day = day;
-      }
-      w.Epoch(51, static_cast<uint32_t>(ms % 86400000), sats);
-      if (w.size() > 16384) throw RinexError(o.obs, epoch.line, "epoch too large for a record");
-      out.Put(w);
-      ++counts.epochs;
+      if (!sats.empty()) WriteEpoch(ms, sats, epoch.line);
     }
-    {
-      RawWriter w = out.Writer();
-      w.EndOfData();
-      out.Put(w);
+  }
+
+  void WriteEpoch(int64_t ms, const std::vector<voxtools::RawSatellite>& sats, int line) {
+    if (sats.size() > 255) throw RinexError(o_.obs, line, "more than 255 satellites");
+    RawWriter w = out_.Writer();
+    const int64_t day = ms / 86400000;
+    if (day != reference_day_) {
+      // Epochs carry only the milliseconds of their day: a new day needs a new reference.
+      std::optional<uint32_t> leap_field;
+      if (leap_) leap_field = static_cast<uint32_t>(*leap_);
+      w.TimeRef("GPS", {0, static_cast<uint32_t>(day)}, {}, leap_field);
+      reference_day_ = day;
     }
-    out.Commit();
-    std::printf("%s: %u epochs, %u ephemerides", o.out.c_str(), counts.epochs, counts.ephemerides);
-    if (counts.skipped_satellites || counts.skipped_ephemerides)
-      std::printf(
-          " (left out: %u satellite observations, %u ephemerides of satellites or "
-          "systems without a place in the raw records)",
-          counts.skipped_satellites, counts.skipped_ephemerides);
-    std::printf("\n");
-    if (o.position) {
-      const auto& xyz = obs.header().approx_position;
-      if (!xyz) {
-        std::fprintf(stderr, "%s: the header gives no approximate position\n", o.obs.c_str());
-      } else {
-        std::printf("PosX=%.4f\nPosY=%.4f\nPosZ=%.4f\n", (*xyz)[0], (*xyz)[1], (*xyz)[2]);
-      }
-    }
+    const size_t epoch_at = w.size();
+    w.Epoch(51, static_cast<uint32_t>(ms % 86400000), sats);
+    if (w.size() - epoch_at > 16384) throw RinexError(o_.obs, line, "epoch too large for a record");
+    out_.Put(w);
+    ++epochs_;
+  }
+
+  const Options& o_;
+  ObsReader obs_;
+  std::vector<rinex::NavReader> navs_;
+  std::optional<int> leap_;
+  Output out_;
+  int64_t reference_day_ = -1;
+  int64_t last_grid_ = -1;
+  uint32_t epochs_ = 0, skipped_satellites_ = 0, ephemerides_ = 0, skipped_ephemerides_ = 0;
+};
+
+int Run(const Options& o) {
+  try {
+    Conversion c(o);
+    c.Run();
+    c.Report();
     return 0;
-  } catch (const RinexError& e) {
-    std::fprintf(stderr, "voxraw from-rinex: %s\n", e.what());
-    return 1;
   } catch (const std::exception& e) {
     std::fprintf(stderr, "voxraw from-rinex: %s\n", e.what());
     return 1;
@@ -578,8 +606,9 @@ void AddFromRinex(CLI::App& app) {
   cmd->add_option("-o,--output", options->out, "raw observation file to write")->required();
   cmd->add_flag("--big-endian", options->big_endian, "write the big-endian byte order");
   cmd->add_option("--interval", options->interval,
-                  "keep only epochs on this grid (seconds, counted from the GPS time origin)")
-      ->check(CLI::NonNegativeNumber);  // epochs within 0.1 s of a grid point are kept
+                  "keep one epoch per grid point of this spacing (seconds from the GPS time "
+                  "origin), the first within 0.1 s of it")
+      ->check(CLI::NonNegativeNumber);
   cmd->add_flag("--position", options->position,
                 "print the header's approximate position as PosX=, PosY=, PosZ= lines");
   cmd->callback([options]() {
