@@ -482,17 +482,12 @@ void NavReader::ReadHeader() {
   }
 }
 
+// Lines after the first line of a record: GLONASS and SBAS records are short (GLONASS gained
+// a line in 3.05); every Keplerian system (GPS, QZSS, Galileo, BDS, IRNSS) writes seven.
 int NavReader::OrbitLines(char system) const {
-  switch (system) {
-    case 'R':
-      return header_.version >= 3.05 ? 4 : 3;
-    case 'S':
-      return 3;
-    case 'I':
-      return 7;
-    default:
-      return 7;
-  }
+  if (system == 'R') return header_.version >= 3.05 ? 4 : 3;
+  if (system == 'S') return 3;
+  return 7;
 }
 
 bool NavReader::Next(NavRecord& record) {
@@ -544,11 +539,8 @@ bool NavReader::Next(NavRecord& record) {
   const int lines = OrbitLines(record.system);
   const size_t orbit_at = v3 ? 4 : 3;
   for (int l = 0; l < lines; ++l) {
-    if (!GetLine(line)) {
-      // The last line of a record may be written short or left out by some writers only when
-      // it holds nothing but optional spares; anything else is a cut file.
-      Fail("file ends inside a navigation record");
-    }
+    // A line may end early (its missing fields read as 0), but it must be there.
+    if (!GetLine(line)) Fail("file ends inside a navigation record");
     for (int i = 0; i < 4; ++i) {
       const auto v = Number(Column(line, orbit_at + 19 * i, 19), ok);
       if (!ok) Fail("unreadable number");
