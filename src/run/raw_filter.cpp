@@ -146,8 +146,9 @@ class WorkerPool {
     slot.running.store(false, std::memory_order_release);
   }
 
-  // The worker has cleared its running flag and is ending: wait for it to be gone, then
-  // merge its records into the result file.
+  // The worker has cleared its running flag and is ending: wait for it to be gone (its exit
+  // may still run the engine's thread-local clean-up, and the engine is unloaded once the
+  // run is over), then merge its records into the result file.
   void Collect(WorkerSlot& slot) {
     slot.thread->Wait(UINT32_MAX);
     slot.thread.reset();

@@ -64,9 +64,11 @@ __attribute__((noinline)) void UseStack(unsigned long kib) {
   block[0] = block[1];
 }
 
+// Read through a volatile pointer, so that no optimiser can prove it null and drop the store.
+int* volatile g_nowhere = nullptr;
+
 void Fault() {
-  volatile int* nowhere = nullptr;
-  *nowhere = 1;
+  *g_nowhere = 1;
 }
 
 uint32_t Group(const char* label, vox_ThreadContext* context) {
