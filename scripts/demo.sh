@@ -1,48 +1,51 @@
 #!/usr/bin/env bash
-# Runs the most complete end-to-end job vox can run today with the freshly built tools:
-# writes a small job file into a scratch folder, runs it with voxrun, and shows what came out.
+# The demo: simulates a GPS survey (a base and a rover on marks, a receiver driving a circle)
+# into a scratch folder, runs it through voxrun twice with the reference engines found beside
+# the library under their default names (a static job for the baseline, a kinematic job for
+# the track; the raw filter first in both), and prints what came out, read back from the
+# result files with the result reader, against the simulator's truth.
+#   scripts/demo.sh [BUILD]      (VOX_DEMO_DURATION=<seconds> for a longer or shorter survey)
 set -euo pipefail
 build=${1:-build}
-voxrun="$build/bin/voxrun"
-if [[ ! -x "$voxrun" ]]; then
-  echo "demo: $voxrun is missing; build first (make build)." >&2
-  exit 1
-fi
-
-scratch=$(mktemp -d "${TMPDIR:-/tmp}/vox-demo-XXXXXX")
-trap 'rm -rf "$scratch"' EXIT
-mkdir -p "$scratch/tmp/engine"   # an "engine" folder switches the engine log on
-
-# CR LF line ends and a run variable, as job files from other systems may carry them. When
-# the team's shared data is beside the repository, a precise orbit file joins the job: data
-# preparation scans it and lists its satellites in the engine log.
-orbit="$(cd "$(dirname "$0")/.." && pwd)/../shared/data/gnss/igs15904.sp3"
-{
-  printf '[JOB]\r\nName=Demo survey $(SITE)\r\nResultPath=results/$(SITE).res\r\n'
-  if [[ -f "$orbit" ]]; then
-    printf 'NumFiles=1\r\n[FILE:1]\r\nName=%s\r\n' "$(realpath "$orbit")"
+for file in bin/voxrun bin/voxsim bin/voxdemo-report lib/kra_rawfilter.dll lib/kra_static.eng \
+            lib/kra_kinematic.eng; do
+  if [[ ! -e "$build/$file" ]]; then
+    echo "demo: $build/$file is missing; build first (make build)." >&2
+    exit 1
   fi
-} > "$scratch/demo.job"
-mkdir -p "$scratch/results"
-
-echo "demo: job file $scratch/demo.job:"
-sed 's/\r$//; s/^/    /' "$scratch/demo.job"
-echo "demo: running voxrun --var SITE=harbour demo.job"
-status=0
-TMPDIR="$scratch/tmp" "$voxrun" --var SITE=harbour "$scratch/demo.job" || status=$?
-
-result="$scratch/results/harbour.res"
-if [[ -f "$result" ]]; then
-  echo "demo: result file $(basename "$result"), $(stat -c %s "$result") bytes:"
-  od -A d -t x1 "$result" | sed 's/^/    /'
-fi
-for log in "$scratch"/tmp/engine/OUT*; do
-  [[ -f "$log" ]] || continue
-  echo "demo: engine log $(basename "$log") ($(wc -l < "$log") lines), first lines:"
-  head -n 12 "$log" | sed 's/^/    /'
 done
-echo "demo: the job was parsed, its result file opened with a header, its files scanned and"
-echo "      listed in the engine log, the pipeline's messages written and the result file"
-echo "      closed with its end record; the raw filter and the engines join the demo when"
-echo "      their scheduling arrives. voxrun exited with $status."
+
+# The scratch folder stays after the demo, so that its NMEA and result files can be looked
+# at; the next demo replaces it.
+scratch="$(cd "$build" && pwd)/demo"
+rm -rf "$scratch"
+mkdir -p "$scratch"
+duration=${VOX_DEMO_DURATION:-1800}
+echo "demo: simulating ${duration} s of a survey at 1 s into $scratch"
+"$build/bin/voxsim" -o "$scratch" -d "$duration" -i 1 -s 2024 > /dev/null
+
+# One survey, two jobs: the job's Type chooses the engine (1: kra_static.eng, 2:
+# kra_kinematic.eng) and kra_rawfilter.dll runs before it. The base's occupation asks for an
+# NMEA file of its single-point fixes; the fan writes its rays to fan.gga.
+make_job() {  # type name
+  sed -e "s/^Type=.*/Type=$1/" -e "s/^ResultPath=.*/ResultPath=$2.res\nNumCPUs=2/" \
+      -e "s/^\[OCCUP:1\]$/[OCCUP:1]\nGGAPath=base-$2.gga/" \
+      "$scratch/survey.job" > "$scratch/$2.job"
+}
+make_job 1 static
+make_job 2 kinematic
+
+status=0
+for job in static kinematic; do
+  echo "demo: voxrun $job.job"
+  "$build/bin/voxrun" -q "$scratch/$job.job" | sed 's/^/    /' || status=$?
+done
+for job in static kinematic; do
+  echo
+  echo "demo: $job job, read back from $scratch/$job.res"
+  nmea=("$scratch/base-$job.gga")
+  if [[ $job == kinematic ]]; then nmea+=("$scratch/fan.gga"); fi
+  "$build/bin/voxdemo-report" "$scratch/$job.res" "$scratch/truth.txt" "${nmea[@]}" \
+    | sed 's/^/    /' || status=$?
+done
 exit "$status"
