@@ -146,15 +146,20 @@ void StoreNavCoord(const io::Occupation& o, const Vec3& mark, const SymMatrix& c
   nav.x = mark[0];
   nav.y = mark[1];
   nav.z = mark[2];
-  const double sx = std::sqrt(std::max(cov(0, 0), 0.0));
-  const double sy = std::sqrt(std::max(cov(1, 1), 0.0));
-  const double sz = std::sqrt(std::max(cov(2, 2), 0.0));
-  nav.sx = static_cast<float>(sx);
-  nav.sy = static_cast<float>(sy);
-  nav.sz = static_cast<float>(sz);
-  nav.rxy = sx * sy > 0 ? static_cast<float>(cov(0, 1) / (sx * sy)) : 0.0f;
-  nav.rxz = sx * sz > 0 ? static_cast<float>(cov(0, 2) / (sx * sz)) : 0.0f;
-  nav.ryz = sy * sz > 0 ? static_cast<float>(cov(1, 2) / (sy * sz)) : 0.0f;
+  const double s[3] = {std::sqrt(std::max(cov(0, 0), 0.0)), std::sqrt(std::max(cov(1, 1), 0.0)),
+                       std::sqrt(std::max(cov(2, 2), 0.0))};
+  // Clamped so that the narrowing to float cannot overflow, whatever the epochs gave.
+  const auto sigma = [&](int i) { return static_cast<float>(std::min(s[i], 1.0e9)); };
+  const auto correlation = [&](int i, int j) {
+    return s[i] * s[j] > 0 ? static_cast<float>(std::clamp(cov(i, j) / (s[i] * s[j]), -1.0, 1.0))
+                           : 0.0f;
+  };
+  nav.sx = sigma(0);
+  nav.sy = sigma(1);
+  nav.sz = sigma(2);
+  nav.rxy = correlation(0, 1);
+  nav.rxz = correlation(0, 2);
+  nav.ryz = correlation(1, 2);
   vox_SetNavCoord(o.id, &nav);
 }
 

@@ -194,12 +194,13 @@ class VectorSolver {
     r.stored_a[2] = static_cast<uint32_t>(s.reference_sat);
     r.stored_a[3] = static_cast<uint32_t>(s.ambiguities.size());
     r.stored_b = static_cast<float>(rms);
-    r.stored_c = static_cast<float>(s.ratio);
+    // A perfect fit makes the ratio unbounded; a float must still hold it.
+    r.stored_c = static_cast<float>(std::min(s.ratio, 1.0e6));
     r.stored_d[0] = base_.id;
     r.stored_d[1] = rover_.id;
     r.stored_d[2] = static_cast<uint32_t>(epochs.front().t_base);
     r.stored_d[3] = static_cast<uint32_t>(epochs.back().t_base);
-    r.stored_e = static_cast<float>(s.sigma0);
+    r.stored_e = static_cast<float>(std::min(s.sigma0, 1.0e9));
     r.stored_f = static_cast<float>(base.rms);
     vox_SetVectorResultEx(report_.writer(), v_.id, &r);
 
