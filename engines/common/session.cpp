@@ -97,13 +97,14 @@ std::optional<BasePosition> ResolveBase(const Occupation& occupation,
 }
 
 double ReportedRms(const SymMatrix& covariance, size_t epochs, double span_seconds, bool phase,
-                   double length) {
-  constexpr double kCorrelationSeconds = 300.0;
+                   double length, bool troposphere_estimated) {
+  constexpr double kCorrelationSeconds = 120.0;
   const double trace = covariance(0, 0) + covariance(1, 1) + covariance(2, 2);
   const double independent =
       std::clamp(span_seconds / kCorrelationSeconds + 1.0, 1.0, std::max(1.0, double(epochs)));
   double variance = std::max(trace, 0.0) * std::max(1.0, epochs / independent);
-  if (phase) variance += 0.015 * 0.015 + (1e-6 * length) * (1e-6 * length);
+  const double troposphere = troposphere_estimated ? 0.005 : 0.015;
+  if (phase) variance += troposphere * troposphere + (1e-6 * length) * (1e-6 * length);
   return std::sqrt(variance);
 }
 

@@ -36,10 +36,11 @@ std::optional<BasePosition> ResolveBase(const Occupation& occupation,
 
 // The rms (m) to report for a differential position. The formal covariance of many epochs
 // is far too optimistic: epochs close in time share their errors (multipath, atmosphere), so
-// the covariance is scaled as if one epoch in five minutes were independent. Phase solutions
-// also carry what no double difference removes: the troposphere difference of two sites and
-// the orbit error, a centimetre and a half plus a part per million of the length.
+// the covariance is scaled as if one epoch in two minutes were independent. Phase solutions
+// also carry what no double difference removes: the troposphere difference of two sites (a
+// centimetre and a half, or half a centimetre left when it was estimated) and the orbit error,
+// a part per million of the length.
 double ReportedRms(const SymMatrix& covariance, size_t epochs, double span_seconds, bool phase,
-                   double length);
+                   double length, bool troposphere_estimated = false);
 
 }  // namespace voxeng::io

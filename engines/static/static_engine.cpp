@@ -20,12 +20,14 @@
 #include <cstdio>
 #include <cstring>
 #include <exception>
+#include <optional>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "dd_params.h"
 #include "session.h"
+#include "troposphere_refine.h"
 
 namespace {
 
@@ -166,6 +168,14 @@ class VectorSolver {
       best = phase;
       kind = phase.fixed ? kFixed : kFloat;
     }
+    if (kind == kFixed) {
+      BaselineSolution refined = best;
+      double zenith = 0;
+      if (RefineWithZenithDelay(epochs, base_antenna, refined, options_, zenith)) {
+        best = refined;
+        zenith_ = zenith;
+      }
+    }
     report_.Progress(95);
     Store(base, best, kind, epochs);
     return true;
@@ -177,7 +187,7 @@ class VectorSolver {
     const Vec3 baseline = rover_mark - base.mark;
     const double rms =
         io::ReportedRms(s.covariance, epochs.size(), epochs.back().t_base - epochs.front().t_base,
-                        kind != kCode, Norm(baseline));
+                        kind != kCode, Norm(baseline), zenith_.has_value());
     vox_VectorResult r;
     std::memset(&r, 0, sizeof r);
     r.solved = 1;
@@ -211,7 +221,12 @@ class VectorSolver {
                   "dX %.4f dY %.4f dZ %.4f m, length %.4f m, rms %.4f m, ratio %.1f",
                   kKinds[kind], epochs.size(), s.observations, base.source.c_str(), baseline[0],
                   baseline[1], baseline[2], Norm(baseline), rms, s.ratio);
-    report_.Message(kInfo, Label(v_) + text);
+    std::string line = Label(v_) + text;
+    if (zenith_) {
+      std::snprintf(text, sizeof text, ", relative zenith delay %.1f mm", *zenith_ * 1000.0);
+      line += text;
+    }
+    report_.Message(kInfo, line);
   }
 
   const Vector& v_;
@@ -222,6 +237,7 @@ class VectorSolver {
   io::Ephemerides eph_;
   DdParams params_{};
   DdOptions options_;
+  std::optional<double> zenith_;  // relative zenith delay of the rover, when estimated
 };
 
 // Solves vectors taken one by one from the shared index until none is left; reports the
