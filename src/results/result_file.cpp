@@ -1,6 +1,8 @@
 #include "results/result_file.h"
 
 #include <cstring>
+#include <filesystem>
+#include <system_error>
 #include <vector>
 
 #include "base/le.h"
@@ -37,6 +39,35 @@ std::vector<uint8_t> EncodePlotLine(uint8_t kind, const uint8_t* bytes, size_t c
   return {out.data(), out.data() + out.size()};
 }
 
+// The length of the leading run of whole records (framing intact) in bytes.
+size_t WholeRecordsLength(const uint8_t* data, size_t size) {
+  size_t at = 0;
+  while (size - at >= kFrameBytes) {
+    const uint16_t length = le::Load<uint16_t>(data + at + 1);
+    if (length < kFrameBytes || length > size - at) break;
+    if (le::Load<uint16_t>(data + at + length - 2) != length) break;
+    at += length;
+  }
+  return at;
+}
+
+// A write that failed part-way (a full disk) leaves the file ending inside a record. Cutting
+// it back to its last whole record gives readers a clean, if incomplete, file.
+void TrimToWholeRecords(const std::string& path) {
+  size_t keep = 0;
+  {
+    auto file = platform::OpenFile(path, platform::FileAccess::kRead,
+                                   platform::FileCreation::kOpenExisting);
+    if (!file) return;
+    auto view = platform::MapWholeFile(*file);
+    if (!view) return;  // empty, or not mappable: nothing to cut
+    keep = WholeRecordsLength(view->data(), view->size());
+    if (keep == view->size()) return;
+  }
+  std::error_code ignored;
+  std::filesystem::resize_file(path, keep, ignored);
+}
+
 }  // namespace
 
 uint32_t MessageType(uint32_t flags) {
@@ -59,7 +90,13 @@ bool TResultFile::Close() {
   // the disk at the closing flush, and a result file that lost its tail must not be reported
   // as complete.
   const bool flushed = file_.Close();
-  return end_written && flushed;
+  if (!end_written || !flushed) {
+    TrimToWholeRecords(path_);
+    return false;
+  }
+  // A file whose folder was removed while it was open takes every write and is gone
+  // afterwards; such a result file was not written, whatever the writes said.
+  return platform::FileExists(path_);
 }
 
 bool TResultFile::is_open() const {

@@ -298,7 +298,9 @@ RawWriter& RawWriter::EndOfData(bool cut) {
 bool RawWriter::Save(const std::string& path) const {
   std::FILE* f = std::fopen(path.c_str(), "wb");
   if (f == nullptr) return false;
-  const bool ok = std::fwrite(bytes_.data(), 1, bytes_.size(), f) == bytes_.size();
+  // An empty writer's buffer may be null, which fwrite must not be given even for no bytes.
+  const bool ok =
+      bytes_.empty() || std::fwrite(bytes_.data(), 1, bytes_.size(), f) == bytes_.size();
   return std::fclose(f) == 0 && ok;
 }
 
