@@ -2,7 +2,7 @@
 BUILD ?= build
 JOBS ?= $(shell nproc)
 
-.PHONY: all deps configure build test demo install clean
+.PHONY: all deps configure build test demo install clean test-asan test-tsan fuzz bench
 
 all: build
 
@@ -26,3 +26,33 @@ install: build
 
 clean:
 	@rm -rf $(BUILD)
+
+# ---- Hardening: the suite under sanitizers, the fuzz targets and the benchmarks, each in a
+# build folder of its own (.ci/run calls them after `make test`).
+#
+# Sanitizer runtime options: leaks count; the library installs its own fault handlers for
+# engine calls, which AddressSanitizer must let it do; undefined behaviour stops the test.
+SANITIZER_ENV = ASAN_OPTIONS=detect_leaks=1:allow_user_segv_handler=1:$(ASAN_OPTIONS) \
+  UBSAN_OPTIONS=print_stacktrace=1:halt_on_error=1:$(UBSAN_OPTIONS) \
+  TSAN_OPTIONS=halt_on_error=1:second_deadlock_stack=1:$(TSAN_OPTIONS)
+FUZZ_SECONDS ?= 60
+
+# The whole suite with AddressSanitizer and UndefinedBehaviorSanitizer.
+test-asan: deps
+	@cmake -S . -B build-asan -G Ninja -DCMAKE_BUILD_TYPE=Debug -DVOX_SANITIZE=address >/dev/null
+	@cmake --build build-asan -j $(JOBS)
+	@$(SANITIZER_ENV) ctest --test-dir build-asan --output-on-failure -j $(JOBS)
+
+# The threaded tests (ctest label "threads") with ThreadSanitizer; only they are built.
+test-tsan: deps
+	@cmake -S . -B build-tsan -G Ninja -DCMAKE_BUILD_TYPE=Debug -DVOX_SANITIZE=thread >/dev/null
+	@cmake --build build-tsan --target vox_threaded_tests -j $(JOBS)
+	@$(SANITIZER_ENV) ctest --test-dir build-tsan --output-on-failure -j $(JOBS) -L threads
+
+# Every fuzz target for FUZZ_SECONDS seconds (clang, build-fuzz).
+fuzz: deps
+	@scripts/fuzz.sh $(FUZZ_SECONDS)
+
+# The benchmarks with their references, as one table (build-bench).
+bench: deps
+	@scripts/bench.sh

@@ -3,7 +3,8 @@
 # Only missing packages are installed, so the script is cheap to call on every `make`.
 set -euo pipefail
 
-packages=(cmake ninja-build g++ make libgtest-dev libgmock-dev nlohmann-json3-dev libcli11-dev proj-bin)
+packages=(cmake ninja-build g++ make libgtest-dev libgmock-dev nlohmann-json3-dev libcli11-dev proj-bin
+  clang-14 libclang-rt-14-dev)
 
 missing=()
 for p in "${packages[@]}"; do
