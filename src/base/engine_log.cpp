@@ -1,8 +1,7 @@
 #include "base/engine_log.h"
 
 #include <atomic>
-#include <mutex>
-#include <shared_mutex>
+#include <memory>
 
 #include "platform/platform.h"
 
@@ -10,11 +9,17 @@ namespace vox {
 
 namespace {
 
-// The open log. Writers check the pointer without the lock first, so tracing with no log
-// open costs one atomic load.
-std::atomic<FILE*> g_log{nullptr};
-// Held shared while writing and exclusively while the log is replaced or closed.
-std::shared_mutex g_log_guard;
+// The open log, shared by reference: a writer holds the file for the length of one write,
+// and a replaced log is closed when its last writer lets go. No writer ever writes into a
+// closed file, and replacing the log never waits for writers.
+struct LogFile {
+  explicit LogFile(FILE* f) : file(f) {}
+  ~LogFile() { std::fclose(file); }
+  FILE* file;
+};
+std::atomic<std::shared_ptr<LogFile>> g_log;
+// Lets tracing with no log open cost one atomic load.
+std::atomic<bool> g_log_open{false};
 std::atomic<void (*)()> g_pump{nullptr};
 
 // Where a run call's log goes: a new "OUT" file in <temp>/engine when that folder exists,
@@ -34,23 +39,19 @@ FILE* OpenLogFile(const std::string& path) {
   return std::fopen(path.c_str(), "w");
 }
 
-// Installs file as the log and closes the previous one once no writer uses it.
+// Installs file as the log; the previous one is closed once no writer uses it.
 void ReplaceLog(FILE* file) {
-  FILE* previous;
-  {
-    std::unique_lock lock(g_log_guard);
-    previous = g_log.exchange(file);
-  }
-  if (previous) std::fclose(previous);
+  std::shared_ptr<LogFile> next = file ? std::make_shared<LogFile>(file) : nullptr;
+  g_log_open.store(next != nullptr, std::memory_order_release);
+  g_log.store(std::move(next));
 }
 
 }  // namespace
 
 void TraceV(const char* format, va_list arguments) {
-  if (format == nullptr || g_log.load(std::memory_order_acquire) == nullptr) return;
-  std::shared_lock lock(g_log_guard);
-  FILE* log = g_log.load(std::memory_order_acquire);
-  if (log) std::vfprintf(log, format, arguments);
+  if (format == nullptr || !g_log_open.load(std::memory_order_acquire)) return;
+  const std::shared_ptr<LogFile> log = g_log.load();
+  if (log) std::vfprintf(log->file, format, arguments);
 }
 
 void Trace(const char* format, ...) {
