@@ -5,6 +5,7 @@
 #include <cstring>
 
 #include "broadcast.h"
+#include "epoch_pairing.h"
 
 namespace voxeng::io {
 
@@ -12,6 +13,7 @@ namespace {
 
 constexpr uint32_t kOccupationTag = 0x02000000u;
 constexpr double kGpsValidity = 7200.0;  // s either side of toe
+constexpr uint32_t kGridOriginSeconds = 608400;
 
 bool Has(const vox_EpochSatData& s, int value) {
   return (s.presence & (1u << value)) != 0;
@@ -51,11 +53,14 @@ void Reporter::Progress(int percent) {
 std::vector<EpochObs> ReadEpochs(uint32_t occupation_id, uint32_t interval_ms, const TimeMs* from,
                                  const TimeMs* to, const StopRequest& stop) {
   std::vector<EpochObs> epochs;
-  void* stream = vox_OpenEpochStream(occupation_id, interval_ms, from, to);
+  // All epochs are read and thinned here: vox's own thinning keeps only exact multiples.
+  // The stream starts at `from` clamped to the occupation; finding `from` itself would fail
+  // when it lies before the occupation's first epoch.
+  void* stream = vox_OpenEpochStream(occupation_id, 0, from, to);
   if (stream == nullptr) return epochs;
   vox_EpochData e;
   vox_EpochSatData s;
-  for (int ok = vox_FindEpoch(stream, from, &e); ok && !stop.Requested();
+  for (int ok = vox_FindEpoch(stream, nullptr, &e); ok && !stop.Requested();
        ok = vox_GetNextEpoch(stream, &e)) {
     EpochObs epoch;
     epoch.time = TimeMs{e.seconds, e.ms};
@@ -72,7 +77,11 @@ std::vector<EpochObs> ReadEpochs(uint32_t occupation_id, uint32_t interval_ms, c
     epochs.push_back(std::move(epoch));
   }
   vox_CloseEpochStream(stream);
-  return epochs;
+  if (interval_ms == 0 || epochs.empty()) return epochs;
+  // The grid vox thins on counts from a multiple of kGridOriginSeconds; so does this one, so
+  // that exactly tagged data keeps the epochs it always kept.
+  const uint32_t start = from ? from->seconds : epochs.front().time.seconds;
+  return ThinEpochs(std::move(epochs), interval_ms, start - start % kGridOriginSeconds);
 }
 
 void Ephemerides::Load(uint32_t from, uint32_t to) {

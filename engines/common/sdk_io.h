@@ -65,7 +65,10 @@ struct EpochObs {
 };
 
 // The GPS observations of an occupation, optionally limited to [from, to] and thinned to
-// interval_ms (0: every epoch). Stops early, returning what it has, when `stop` is requested.
+// interval_ms (0: every epoch). The thinning keeps the epoch nearest each multiple of the
+// interval when it lies within a tenth of the interval (at most 0.1 s) of it: receivers tag
+// epochs a few milliseconds off the whole second, and exact multiples would lose them.
+// Stops early, returning what it has, when `stop` is requested.
 // Empty when the occupation has no epochs or its file cannot be read.
 std::vector<EpochObs> ReadEpochs(uint32_t occupation_id, uint32_t interval_ms, const TimeMs* from,
                                  const TimeMs* to, const StopRequest& stop);

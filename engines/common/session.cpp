@@ -10,9 +10,6 @@ namespace voxeng::io {
 
 namespace {
 
-bool SameTime(const TimeMs& a, const TimeMs& b) {
-  return a.seconds == b.seconds && a.ms == b.ms;
-}
 bool Before(const TimeMs& a, const TimeMs& b) {
   return a.seconds < b.seconds || (a.seconds == b.seconds && a.ms < b.ms);
 }
@@ -26,32 +23,18 @@ bool Overlap(const Occupation& a, const Occupation& b, TimeMs& from, TimeMs& to)
   return Seconds(to) - Seconds(from) >= 1.0;
 }
 
+std::vector<EpochObs> ReadSpanEpochs(uint32_t occupation_id, uint32_t interval_ms,
+                                     const TimeMs& from, const TimeMs& to,
+                                     const StopRequest& stop) {
+  const TimeMs wide_from = ShiftMs(from, -kMaxPairingMs), wide_to = ShiftMs(to, kMaxPairingMs);
+  return ReadEpochs(occupation_id, interval_ms, &wide_from, &wide_to, stop);
+}
+
 std::vector<DdEpoch> PairEpochs(const std::vector<EpochObs>& base,
                                 const std::vector<EpochObs>& rover, const Ephemerides& eph) {
-  std::vector<DdEpoch> out;
-  size_t j = 0;
-  for (const EpochObs& b : base) {
-    while (j < rover.size() && Before(rover[j].time, b.time))
-      ++j;
-    if (j == rover.size()) break;
-    if (!SameTime(rover[j].time, b.time)) continue;
-    const EpochObs& r = rover[j];
-    DdEpoch dd;
-    dd.t_base = b.t;
-    dd.t_rover = r.t;
-    for (const SatObs& sb : b.sats) {
-      const auto sr = std::find_if(r.sats.begin(), r.sats.end(),
-                                   [&](const SatObs& s) { return s.prn == sb.prn; });
-      if (sr == r.sats.end()) continue;
-      const vox_GpsOrbitParams* orbit = eph.Find(sb.prn, b.t);
-      if (orbit == nullptr) continue;
-      const bool phase = sb.l1 != 0 && sr->l1 != 0;
-      dd.sats.push_back({sb.prn, orbit, sb.p1, sr->p1, phase ? sb.l1 : 0.0, phase ? sr->l1 : 0.0,
-                         sb.slip || sr->slip});
-    }
-    out.push_back(std::move(dd));
-  }
-  return out;
+  return PairEpochs(
+      base, rover, [&eph](int prn, double t) { return eph.Find(prn, t); },
+      PairingToleranceMs(base, rover));
 }
 
 std::optional<Vec3> MeanPointPosition(const std::vector<EpochObs>& epochs, const Ephemerides& eph,

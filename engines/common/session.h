@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "double_difference.h"
+#include "epoch_pairing.h"
 #include "sdk_io.h"
 
 namespace voxeng::io {
@@ -15,7 +16,14 @@ namespace voxeng::io {
 // The span both occupations cover; false when they do not overlap by at least one second.
 bool Overlap(const Occupation& a, const Occupation& b, TimeMs& from, TimeMs& to);
 
-// Epochs of equal time tag, with every satellite both receivers saw and an orbit exists for.
+// The epochs of an occupation over the common span [from, to] widened by the largest pairing
+// tolerance: an epoch tagged a few milliseconds before the other receiver's first epoch (or
+// after its last) still pairs with it.
+std::vector<EpochObs> ReadSpanEpochs(uint32_t occupation_id, uint32_t interval_ms,
+                                     const TimeMs& from, const TimeMs& to, const StopRequest& stop);
+
+// Epochs whose time tags lie within the pairing tolerance of the two receivers (see
+// epoch_pairing.h), with every satellite both receivers saw and an orbit exists for.
 std::vector<DdEpoch> PairEpochs(const std::vector<EpochObs>& base,
                                 const std::vector<EpochObs>& rover, const Ephemerides& eph);
 

@@ -109,8 +109,9 @@ class VectorSolver {
 
     eph_.Load(from_.seconds, to_.seconds + 1);
     if (eph_.Empty()) return Fail("no GPS broadcast ephemeris for the common span");
-    const auto base_epochs = io::ReadEpochs(base_.id, params_.interval_ms, &from_, &to_, g_stop);
-    const auto rover_epochs = io::ReadEpochs(rover_.id, params_.interval_ms, &from_, &to_, g_stop);
+    const auto base_epochs = io::ReadSpanEpochs(base_.id, params_.interval_ms, from_, to_, g_stop);
+    const auto rover_epochs =
+        io::ReadSpanEpochs(rover_.id, params_.interval_ms, from_, to_, g_stop);
     if (g_stop.Requested()) return Fail("stopped on request");
     const auto base = io::ResolveBase(base_, base_epochs, eph_);
     if (!base) return Fail("no position for the base point");

@@ -127,11 +127,29 @@ TEST_F(SurveyJob, StaticBaselineAgreesWithTheHeaderPositions) {
   const double off = Distance(got, expected);
   const unsigned kind = v.flags & 3u;  // 1 fixed phase, 2 float phase, 3 code only
   const char* names[] = {"unsolved", "fixed carrier phase", "float carrier phase", "code"};
-  std::printf("baseline 0759 -> 3040: %s solution, %.3f m from the header difference\n",
-              names[kind], off);
+  const unsigned common = v.values_80[1];  // the epochs the two receivers have in common
+  std::printf(
+      "baseline 0759 -> 3040: %s solution from %u of 120 epochs, %.3f m from the header "
+      "difference\n",
+      names[kind], common, off);
   RecordProperty("baseline_offset_m", std::to_string(off));
+  RecordProperty("common_epochs", std::to_string(common));
   EXPECT_NE(kind, 0u);
   EXPECT_LT(off, 0.5);
+}
+
+// The two receivers tag their epochs by their own drifting clocks: 0759 from 1 to 5 ms after
+// the half minute, 3040 down to 4 ms before it, so only a tenth of the tags agree exactly.
+// Every epoch must still pair with the other station's, and an hour of them fixes the
+// integers clearly: an offset mishandled in the geometry (the satellites move about 0.8 m of
+// range per millisecond) would leave metres in the double differences and no fix.
+TEST_F(SurveyJob, EpochsTaggedMillisecondsApartStillPairAndFix) {
+  const auto vectors = Records<tools::VectorRec>();
+  ASSERT_EQ(vectors.size(), 1u);
+  const tools::VectorRec& v = vectors[0];
+  EXPECT_EQ(v.values_80[1], 120u) << "common epochs";
+  EXPECT_EQ(v.flags & 3u, 1u) << "not a fixed carrier-phase solution";
+  EXPECT_GT(v.value_100, 10.0f) << "ratio of the integer fix";
 }
 
 }  // namespace
