@@ -11,6 +11,10 @@ set(VOX_VERSION_SCRIPT ${PROJECT_BINARY_DIR}/vox.map)
 set_property(DIRECTORY ${PROJECT_SOURCE_DIR} APPEND PROPERTY CMAKE_CONFIGURE_DEPENDS ${VOX_EXPORT_LIST})
 
 file(STRINGS ${VOX_EXPORT_LIST} vox_export_lines)
+if(WIN32)
+  # Windows exports through a module-definition file made from the same list.
+  include(${PROJECT_SOURCE_DIR}/cmake/WindowsPackage.cmake)
+else()
 set(vox_map "{\n  global:\n")
 foreach(line IN LISTS vox_export_lines)
   string(STRIP "${line}" line)
@@ -24,6 +28,7 @@ file(CONFIGURE OUTPUT ${VOX_VERSION_SCRIPT} CONTENT "${vox_map}" @ONLY)
 
 target_link_options(vox PRIVATE "LINKER:--version-script=${VOX_VERSION_SCRIPT}")
 set_property(TARGET vox APPEND PROPERTY LINK_DEPENDS ${VOX_VERSION_SCRIPT})
+endif()
 
 # Engines in this tree link the same name an outside engine gets from find_package(vox).
 add_library(vox::vox ALIAS vox)
@@ -37,6 +42,8 @@ set(VOX_CMAKE_DIR ${CMAKE_INSTALL_LIBDIR}/cmake/vox)
 # gives a usable SDK without the tools.
 install(TARGETS vox EXPORT voxTargets
   LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT sdk
+  RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR} COMPONENT sdk
+  ARCHIVE DESTINATION ${CMAKE_INSTALL_LIBDIR} COMPONENT sdk
   INCLUDES DESTINATION ${CMAKE_INSTALL_INCLUDEDIR})
 install(DIRECTORY ${PROJECT_SOURCE_DIR}/include/vox DESTINATION ${CMAKE_INSTALL_INCLUDEDIR}
   COMPONENT sdk FILES_MATCHING PATTERN "*.h")

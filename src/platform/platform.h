@@ -104,9 +104,9 @@ const char* NullDevicePath();
 
 enum class FileAccess { kRead, kWrite };
 enum class FileCreation {
-  kOpenExisting,    // fail when the file does not exist
-  kOpenOrCreate,    // keep an existing file's content
-  kCreateAlways,    // create, replacing (emptying) an existing file
+  kOpenExisting,  // fail when the file does not exist
+  kOpenOrCreate,  // keep an existing file's content
+  kCreateAlways,  // create, replacing (emptying) an existing file
 };
 
 // An open OS file. Sizes and offsets are 64-bit here; TBufFile narrows them.
@@ -202,5 +202,56 @@ struct GuardReport {
 // on to the handler that was installed before. The thread's floating-point mode is as
 // before the call when a fault was caught.
 GuardReport RunGuarded(const std::function<void()>& fn);
+
+// ---------------------------------------------------------------- control window
+
+// The OS side of a run's control window: only the mechanics of creating and closing it,
+// delivering commands to it, releasing a sender early, the pause loop and message pumping.
+// What the commands do belongs to the run room, which supplies it as ControlWindowProcs.
+//
+// On Windows the window is the hidden window "EngineControlWindow" of class "EngCtrlWndCls",
+// created on the thread of the run call, and a command is the registered message
+// "EngCtrlWndMsg" (command in wParam, argument in lParam), carried out on that thread. On
+// POSIX a handle is a generation number and a command runs on the sender's thread. Handles
+// are never 0; every function may be called from any thread.
+struct ControlWindowProcs {
+  // Carries out one command and returns its result.
+  uint32_t (*execute)(uint32_t command, uintptr_t argument) = nullptr;
+  // True while a pause is in force; the window's pause loop runs until it turns false.
+  bool (*paused)() = nullptr;
+};
+// Installs the procedures; called before the first window is opened.
+void SetControlWindowProcs(const ControlWindowProcs& procs);
+
+enum class ControlWindowFailure { kNone, kRegisterClass, kCreateWindow };
+struct ControlWindowOpened {
+  uintptr_t handle = 0;  // 0 on failure
+  ControlWindowFailure failure = ControlWindowFailure::kNone;
+  uint32_t error = 0;  // the system's error code of the failure
+};
+// Opens a new window on the calling thread (which then owns it and must keep handling its
+// messages while a job runs); closes the previous one first if it is still open.
+ControlWindowOpened OpenControlWindow();
+// Closes the window if it is the open one, and returns once it is closed: on Windows by
+// sending WM_CLOSE, which waits until the window's thread has handled it.
+void CloseControlWindow(uintptr_t handle);
+bool ControlWindowIsOpen(uintptr_t handle);
+// The handle of the open window (0 if none), and whether handle is the latest one opened.
+uintptr_t CurrentControlWindow();
+bool IsLatestControlWindow(uintptr_t handle);
+// The title starts as "EngineControlWindow". Setting it never waits for the window's thread.
+void SetControlWindowTitle(uintptr_t handle, const std::string& title);
+// Copies the title (cut to fit, terminated when capacity > 0) and returns its full length;
+// 0 and an empty buffer for a window that is not open.
+size_t GetControlWindowTitle(uintptr_t handle, char* buffer, size_t capacity);
+// Delivers one command to the open window and returns its result; 0 when handle is not the
+// open window.
+uint32_t SendControlMessage(uintptr_t handle, uint32_t command, uintptr_t argument);
+// Dispatches every message waiting for the calling thread, without waiting (nothing to do on
+// POSIX, which has no thread message queues).
+void PumpPendingMessages();
+// Waits until thread has ended, handling the calling thread's messages meanwhile (the
+// control window may live on this thread).
+void WaitForThreadHandlingMessages(Thread& thread);
 
 }  // namespace vox::platform

@@ -1,8 +1,9 @@
 #include "run/control_channel.h"
 
-#include <cstring>
 #include <mutex>
 
+#include "base/engine_log.h"
+#include "platform/platform.h"
 #include "run/current_task.h"
 #include "run/run_state.h"
 
@@ -16,18 +17,6 @@ struct CallbackPair {
   void* context;
 };
 
-struct Channel {
-  std::mutex mutex;
-  uint64_t last_generation = 0;
-  uint64_t open = 0;  // 0: no window open
-  std::string title;
-};
-
-Channel& TheChannel() {
-  static Channel channel;
-  return channel;
-}
-
 uint32_t RegisterCallback(uintptr_t argument) {
   const auto* pair = reinterpret_cast<const CallbackPair*>(argument);
   if (pair == nullptr) return kCommandCallback;
@@ -40,81 +29,15 @@ uint32_t RegisterCallback(uintptr_t argument) {
   return kCommandCallback;
 }
 
-}  // namespace
-
-uint64_t OpenControlWindow() {
-  Channel& c = TheChannel();
-  std::lock_guard lock(c.mutex);
-  c.open = ++c.last_generation;
-  c.title = kInitialWindowTitle;
-  TheRun().pause_flag.store(0);
-  return c.open;
-}
-
-void CloseControlWindow(uint64_t handle) {
-  Channel& c = TheChannel();
-  std::lock_guard lock(c.mutex);
-  if (handle == 0 || handle != c.open) return;
-  c.open = 0;
-  c.title.clear();
-  // Nothing waits on a pause here, but a pause left standing would outlive the window that
-  // could have lifted it; drop it with the window.
-  TheRun().pause_flag.store(0);
-}
-
-bool ControlWindowIsOpen(uint64_t handle) {
-  Channel& c = TheChannel();
-  std::lock_guard lock(c.mutex);
-  return handle != 0 && handle == c.open;
-}
-
-uint64_t CurrentWindow() {
-  Channel& c = TheChannel();
-  std::lock_guard lock(c.mutex);
-  return c.open;
-}
-
-void SetControlWindowTitle(uint64_t handle, const std::string& title) {
-  Channel& c = TheChannel();
-  std::lock_guard lock(c.mutex);
-  if (handle != 0 && handle == c.open) c.title = title;
-}
-
-size_t GetControlWindowTitle(uint64_t handle, char* buffer, size_t capacity) {
-  Channel& c = TheChannel();
-  std::lock_guard lock(c.mutex);
-  if (handle == 0 || handle != c.open) {
-    if (buffer != nullptr && capacity > 0) buffer[0] = '\0';
-    return 0;
-  }
-  if (buffer != nullptr && capacity > 0) {
-    const size_t n = c.title.size() < capacity - 1 ? c.title.size() : capacity - 1;
-    std::memcpy(buffer, c.title.data(), n);
-    buffer[n] = '\0';
-  }
-  return c.title.size();
-}
-
-bool IsLatestWindow(uint64_t handle) {
-  Channel& c = TheChannel();
-  std::lock_guard lock(c.mutex);
-  return handle != 0 && handle == c.last_generation;
-}
-
-uint32_t SendControlCommand(uint64_t handle, uint32_t command, uintptr_t argument) {
-  // Registration is the one command the latest handle still takes after its job has ended:
-  // a host registers right after the run call, and a job may end before it gets there. The
-  // callback it registers is told the exit code at once.
-  if (command == kCommandCallback && IsLatestWindow(handle)) return RegisterCallback(argument);
-  if (!ControlWindowIsOpen(handle)) return 0;
+uint32_t Execute(uint32_t command, uintptr_t argument) {
   RunState& run = TheRun();
   switch (command) {
     case kCommandBreak:
       run.break_flag.store(1);
       return 0;
     case kCommandPause:
-      // The sender is released at once; the flag is all a pause amounts to here (see
-      // vox_host.h).
+      // The sender has been released already where the OS can do that; the window's own
+      // thread then stays in the pause loop until the flag is cleared (see vox_host.h).
       run.pause_flag.store(1);
       return 1;
     case kCommandResume:
@@ -135,6 +58,80 @@ uint32_t SendControlCommand(uint64_t handle, uint32_t command, uintptr_t argumen
     default:
       return 0;
   }
+}
+
+bool Paused() {
+  return TheRun().pause_flag.load() != 0;
+}
+
+// The window layer learns what the commands do, and the message operation of the engine
+// log pumps the window's messages, before the first window opens.
+void Connect() {
+  static std::once_flag connected;
+  std::call_once(connected, [] {
+    platform::ControlWindowProcs procs;
+    procs.execute = Execute;
+    procs.paused = Paused;
+    platform::SetControlWindowProcs(procs);
+    SetMessagePump(platform::PumpPendingMessages);
+  });
+}
+
+}  // namespace
+
+uint64_t OpenControlWindow() {
+  Connect();
+  TheRun().pause_flag.store(0);
+  const platform::ControlWindowOpened opened = platform::OpenControlWindow();
+  switch (opened.failure) {
+    case platform::ControlWindowFailure::kNone:
+      break;
+    case platform::ControlWindowFailure::kRegisterClass:
+      Trace("Can not registered class / errno=%u\n", opened.error);
+      Trace("Can not register window class\n");
+      break;
+    case platform::ControlWindowFailure::kCreateWindow:
+      Trace("Can not create window\n");
+      break;
+  }
+  return opened.handle;
+}
+
+void CloseControlWindow(uint64_t handle) {
+  if (handle == 0 || handle != platform::CurrentControlWindow()) return;
+  platform::CloseControlWindow(static_cast<uintptr_t>(handle));
+  // A pause left standing would outlive the window that could have lifted it; drop it with
+  // the window.
+  TheRun().pause_flag.store(0);
+}
+
+bool ControlWindowIsOpen(uint64_t handle) {
+  return platform::ControlWindowIsOpen(static_cast<uintptr_t>(handle));
+}
+
+uint64_t CurrentWindow() {
+  return platform::CurrentControlWindow();
+}
+
+void SetControlWindowTitle(uint64_t handle, const std::string& title) {
+  platform::SetControlWindowTitle(static_cast<uintptr_t>(handle), title);
+}
+
+size_t GetControlWindowTitle(uint64_t handle, char* buffer, size_t capacity) {
+  return platform::GetControlWindowTitle(static_cast<uintptr_t>(handle), buffer, capacity);
+}
+
+bool IsLatestWindow(uint64_t handle) {
+  return platform::IsLatestControlWindow(static_cast<uintptr_t>(handle));
+}
+
+uint32_t SendControlCommand(uint64_t handle, uint32_t command, uintptr_t argument) {
+  // Registration is the one command the latest handle still takes after its job has ended:
+  // a host registers right after the run call, and a job may end before it gets there. The
+  // callback it registers is told the exit code at once.
+  if (command == kCommandCallback && IsLatestWindow(handle) && !ControlWindowIsOpen(handle))
+    return RegisterCallback(argument);
+  return platform::SendControlMessage(static_cast<uintptr_t>(handle), command, argument);
 }
 
 }  // namespace vox

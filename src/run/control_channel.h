@@ -1,14 +1,14 @@
-// The control channel: the POSIX form of the run's control window.
+// The control channel: what the run's control window does with its commands.
 //
-// A run opens one "window" and the host steers the job through it with numbered commands
-// (SendEngineControl in vox_host.h). A handle is a generation number, never a pointer: the
-// channel keeps only the generation of the window that is open now, so a command sent on any
-// other handle (a window that has been closed, or one that never existed) finds nothing and
-// returns 0. Handles therefore stay harmless for the life of the process.
+// A run opens one window and the host steers the job through it with numbered commands
+// (SendEngineControl in vox_host.h). The window's mechanics are the platform's (on Windows
+// a hidden window and a registered message, on POSIX a generation number; see platform.h):
+// a command sent on a window that has been closed, or one that never existed, finds nothing
+// and returns 0, so handles stay harmless for the life of the process.
 //
-// Threads: every function may be called from any thread. The open generation and the title
-// are guarded by a mutex; commands run on the caller's thread and touch only the run state's
-// atomics, so a command that races with the window's closing is still harmless.
+// Threads: every function may be called from any thread. Commands touch only the run state's
+// atomics, so a command that races with the window's closing is still harmless. On Windows
+// commands run on the window's thread, which must keep handling messages while a job runs.
 #pragma once
 
 #include <cstddef>
@@ -33,11 +33,13 @@ enum ControlCommand : uint32_t {
 // The title a window has until the pipeline names it after the job.
 inline constexpr const char* kInitialWindowTitle = "EngineControlWindow";
 
-// Opens a new window, closing the one that is open (a failed job may leave its window open
-// until the next run). Returns its handle, never 0.
+// Opens a new window on the calling thread, closing the one that is open (a failed job may
+// leave its window open until the next run). Returns its handle; 0 when the window cannot be
+// made, after tracing why ("Can not register window class", "Can not create window").
 uint64_t OpenControlWindow();
 // Closes the open window, if handle is that window; later commands on it return 0. A pause
-// still in force is dropped with it.
+// still in force is dropped with it. On Windows this waits until the window's thread has
+// handled the close.
 void CloseControlWindow(uint64_t handle);
 bool ControlWindowIsOpen(uint64_t handle);
 // The handle of the open window, 0 if none.

@@ -54,6 +54,12 @@ Started StartJob(TRunContext* context, platform::ThreadProc proc) {
   Started started;
   started.window = OpenControlWindow();
   RunState& run = TheRun();
+  if (started.window == 0) {
+    // Refused before anything started: the run is over and the record goes.
+    delete context;
+    run.run_in_flight.store(false);
+    return started;
+  }
   run.job_thread_id.store(0);
   run.break_flag.store(0);
   run.progress.store(0);
@@ -88,13 +94,14 @@ uint64_t RunJobFile(const std::string& path, const std::vector<std::string>& var
   for (const std::string& v : variables)
     context->variables.Add(v);
   Started started = StartJob(context, FileJobThread);
-  if (!wait) return started.window;
+  if (!wait || started.window == 0) return wait ? 0 : started.window;
   if (!started.thread) {
     Trace("Can not run thread\n");
     return 0;
   }
-  // No message pumping is needed here: nothing the job thread does waits on this thread.
-  started.thread->Wait(UINT32_MAX);
+  // The control window lives on this thread, and the job thread's last act waits for it to
+  // handle the close: keep handling messages while waiting.
+  platform::WaitForThreadHandlingMessages(*started.thread);
   return 1;
 }
 

@@ -1,0 +1,40 @@
+# The test suite of the Windows build (included by tests/CMakeLists.txt when WIN32).
+#
+# GoogleTest is built from Debian's sources for the cross compiler. Each test program runs
+# whole under Wine (one Wine start per program, not per case), from scripts/test-windows.sh
+# or ctest. Suites that need POSIX-only facilities (fork, resource limits, /proc, signals,
+# the ELF loader) are not built here.
+set(VOX_GOOGLETEST_SOURCE /usr/src/googletest CACHE PATH "GoogleTest sources for the cross build")
+set(INSTALL_GTEST OFF CACHE BOOL "" FORCE)
+set(gtest_disable_pthreads OFF CACHE BOOL "" FORCE)
+add_subdirectory(${VOX_GOOGLETEST_SOURCE} ${PROJECT_BINARY_DIR}/googletest EXCLUDE_FROM_ALL)
+foreach(target gtest gtest_main gmock gmock_main)
+  if(TARGET ${target} AND NOT TARGET GTest::${target})
+    add_library(GTest::${target} ALIAS ${target})
+    # GoogleTest's own sources are not ours to hold to our warning flags.
+    target_compile_options(${target} PRIVATE -w)
+  endif()
+endforeach()
+
+get_filename_component(VOX_SHARED_DIR "${PROJECT_SOURCE_DIR}/../shared" ABSOLUTE)
+
+# vox_test(NAME SOURCES...): as on Linux, but one ctest entry per program.
+function(vox_test name)
+  add_executable(${name} ${ARGN})
+  target_link_libraries(${name} PRIVATE vox_internal GTest::gtest GTest::gmock GTest::gtest_main)
+  if(TARGET vox_test_support)
+    target_link_libraries(${name} PRIVATE vox_test_support)
+  endif()
+  target_compile_definitions(${name} PRIVATE
+    VOX_SHARED_DIR="${VOX_SHARED_DIR}"
+    VOX_BUILD_DIR="${PROJECT_BINARY_DIR}"
+    VOX_TEST_ENGINE_DIR="${PROJECT_BINARY_DIR}/tests/engines")
+  add_test(NAME ${name} COMMAND ${name})
+  set_tests_properties(${name} PROPERTIES TIMEOUT 300 LABELS windows)
+  set_property(GLOBAL APPEND PROPERTY VOX_WINDOWS_TESTS ${name})
+endfunction()
+add_custom_target(vox_threaded_tests)
+
+set(tests_dir ${PROJECT_SOURCE_DIR}/tests)
+add_subdirectory(${tests_dir}/platform ${PROJECT_BINARY_DIR}/tests/platform)
+add_subdirectory(${tests_dir}/windows ${PROJECT_BINARY_DIR}/tests/windows)
