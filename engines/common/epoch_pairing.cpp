@@ -1,6 +1,7 @@
 #include "epoch_pairing.h"
 
 #include <algorithm>
+#include <cmath>
 #include <cstdlib>
 
 namespace voxeng::io {
@@ -82,19 +83,21 @@ std::vector<DdEpoch> PairEpochs(const std::vector<EpochObs>& base,
 std::vector<EpochObs> ThinEpochs(std::vector<EpochObs> epochs, uint32_t interval_ms,
                                  uint32_t origin_seconds) {
   const int64_t interval = interval_ms;
-  if (interval == 0 || interval <= NominalIntervalMs(epochs)) return epochs;
+  // Data already at about the interval (its tags drift) or coarser keeps every epoch.
+  if (interval == 0 || interval * 10 <= NominalIntervalMs(epochs) * 11) return epochs;
   const int64_t tolerance = ToleranceOf(interval);
   const TimeMs origin{origin_seconds, 0};
   std::vector<EpochObs> out;
-  int64_t last_slot = -1;
+  bool any = false;
+  int64_t last_slot = 0;
   int64_t last_offset = 0;
   for (EpochObs& e : epochs) {
     const int64_t since = DiffMs(e.time, origin);
-    if (since < 0) continue;
-    const int64_t slot = (since + interval / 2) / interval;
+    // Milliseconds stay exact in a double; floor keeps epochs before the origin right too.
+    const auto slot = static_cast<int64_t>(std::floor(double(since) / double(interval) + 0.5));
     const int64_t offset = std::llabs(since - slot * interval);
     if (offset > tolerance) continue;
-    if (slot == last_slot) {
+    if (any && slot == last_slot) {
       if (offset < last_offset) {
         out.back() = std::move(e);
         last_offset = offset;
@@ -102,6 +105,7 @@ std::vector<EpochObs> ThinEpochs(std::vector<EpochObs> epochs, uint32_t interval
       continue;
     }
     out.push_back(std::move(e));
+    any = true;
     last_slot = slot;
     last_offset = offset;
   }

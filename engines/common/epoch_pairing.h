@@ -57,7 +57,8 @@ std::vector<DdEpoch> PairEpochs(const std::vector<EpochObs>& base,
 
 // The epochs nearest the multiples of interval_ms (counted from origin_seconds), one per
 // multiple, when they lie within a tenth of the interval (at most kMaxPairingMs) of it.
-// Epochs already at the interval or coarser are all kept: there is nothing to thin.
+// Epochs already at about the interval (up to a tenth more) or coarser are all kept: there
+// is nothing to thin.
 std::vector<EpochObs> ThinEpochs(std::vector<EpochObs> epochs, uint32_t interval_ms,
                                  uint32_t origin_seconds);
 

@@ -359,18 +359,34 @@ TEST(PointSolution, TooFewSatellitesIsAFailureNotAPosition) {
   EXPECT_FALSE(voxeng::SolvePoint(t, {}).ok);
 }
 
+// With base_tag or rover_tag (seconds, static rover only) a receiver tags its epochs that far
+// off the nominal epoch, as a receiver with a drifting clock does, and observes at its tag.
 std::vector<voxeng::DdEpoch> DdSession(const voxsim::Survey& s, std::vector<EpochData>& store,
-                                       const Vec3& rover_antenna, bool moving) {
+                                       const Vec3& rover_antenna, bool moving, double base_tag = 0,
+                                       double rover_tag = 0) {
   voxsim::ReceiverSim base(21, s.options.start, 0.12), rover(22, s.options.start, 0.125);
+  // Observe() takes both receivers; these stand in for the one whose output is not used.
+  voxsim::ReceiverSim spare_b(23, s.options.start, 0.12), spare_r(24, s.options.start, 0.125);
+  const bool apart = base_tag != 0 || rover_tag != 0;
   std::vector<voxeng::DdEpoch> epochs;
   store.reserve(s.EpochCount());
   for (size_t k = 0; k < s.EpochCount(); ++k) {
     const double t = s.EpochTime(k);
-    store.push_back(
-        Observe(s, base, rover, s.base.Antenna(), moving ? s.KinematicAt(t) : rover_antenna, t));
+    if (!apart) {
+      store.push_back(
+          Observe(s, base, rover, s.base.Antenna(), moving ? s.KinematicAt(t) : rover_antenna, t));
+    } else {
+      EpochData b = Observe(s, base, spare_r, s.base.Antenna(), rover_antenna, t + base_tag);
+      const EpochData r =
+          Observe(s, spare_b, rover, s.base.Antenna(), rover_antenna, t + rover_tag);
+      b.rover = r.rover;
+      b.seen_rover = r.seen_rover;
+      store.push_back(std::move(b));
+    }
     const EpochData& e = store.back();
     voxeng::DdEpoch dd;
-    dd.t_base = dd.t_rover = t;
+    dd.t_base = t + base_tag;
+    dd.t_rover = t + rover_tag;
     for (size_t i = 0; i < e.orbits.size(); ++i)
       if (e.seen_base[i] && e.seen_rover[i])
         dd.sats.push_back({static_cast<int>(s.satellites[i].prn), &e.orbits[i], e.base[i].p1,
@@ -453,6 +469,31 @@ TEST(DoubleDifference, KinematicPhaseFixesEveryEpochToCentimetres) {
   }
   EXPECT_LT(std::sqrt(sum2 / epochs.size()), 0.03);
   EXPECT_LT(worst, 0.08);
+}
+
+// Receivers tagging their epochs milliseconds apart (base 4 ms early, rover 7 ms late): each
+// receiver's ranges come from its own tag and its own transmit times, so the clocks still
+// cancel and the baseline fixes as with equal tags. Pretending both observed at the base's
+// tag must go wrong by far more: the offsets are really in the data.
+TEST(DoubleDifference, EpochsTaggedMillisecondsApartGiveTheSameBaseline) {
+  const voxsim::Survey s = TestSurvey(1800, 15);
+  std::vector<EpochData> store;
+  const Vec3 truth = s.rover.Antenna();
+  auto epochs = DdSession(s, store, truth, false, -0.004, 0.007);
+  const voxeng::BaselineSolution code =
+      voxeng::SolveCodeBaseline(epochs, s.base.Antenna(), truth + Vec3{4, -3, 5});
+  ASSERT_TRUE(code.ok);
+  EXPECT_LT(voxeng::Norm(code.rover - truth), 0.5);
+  const voxeng::BaselineSolution sol =
+      voxeng::SolvePhaseBaseline(epochs, s.base.Antenna(), truth + Vec3{1, 1, 1});
+  ASSERT_TRUE(sol.fixed) << "ratio " << sol.ratio;
+  EXPECT_LT(voxeng::Norm(sol.rover - truth), 0.03);
+
+  for (auto& e : epochs)
+    e.t_rover = e.t_base;
+  const voxeng::BaselineSolution wrong =
+      voxeng::SolvePhaseBaseline(epochs, s.base.Antenna(), truth + Vec3{1, 1, 1});
+  EXPECT_TRUE(!wrong.ok || voxeng::Norm(wrong.rover - truth) > 0.1);
 }
 
 TEST(DoubleDifference, AmbiguityArcsRestartAfterALossOfLock) {
