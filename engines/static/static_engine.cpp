@@ -209,8 +209,9 @@ class VectorSolver {
     r.stored_c = static_cast<float>(std::min(s.ratio, 1.0e6));
     r.stored_d[0] = base_.id;
     r.stored_d[1] = rover_.id;
-    r.stored_d[2] = static_cast<uint32_t>(epochs.front().t_base);
-    r.stored_d[3] = static_cast<uint32_t>(epochs.back().t_base);
+    // The nominal seconds: a receiver tags its epochs a few ms either side of them.
+    r.stored_d[2] = static_cast<uint32_t>(std::floor(epochs.front().t_base + 0.5));
+    r.stored_d[3] = static_cast<uint32_t>(std::floor(epochs.back().t_base + 0.5));
     r.stored_e = static_cast<float>(std::min(s.sigma0, 1.0e9));
     r.stored_f = static_cast<float>(base.rms);
     vox_SetVectorResultEx(report_.writer(), v_.id, &r);

@@ -152,5 +152,43 @@ TEST_F(SurveyJob, EpochsTaggedMillisecondsApartStillPairAndFix) {
   EXPECT_GT(v.value_100, 10.0f) << "ratio of the integer fix";
 }
 
+// Thinned to a minute, the same drifting tags must keep the epoch nearest every whole
+// minute (exact multiples would keep only the few tagged on the second).
+TEST(SurveyJobThinned, EpochsTaggedOffTheMinuteStillThinToOneAMinute) {
+  REQUIRE_GNSS_DATA();
+#ifndef VOX_REFERENCE_ENGINES
+  GTEST_SKIP() << "the reference engines are not part of this build";
+#endif
+  ScratchDir scratch;
+  const std::string dir = scratch.path().string();
+  const ToolRun a = RunVoxraw({"from-rinex", GnssDir() + "/07590920.05o",
+                               GnssDir() + "/07590920.05n", "-o", dir + "/0759.raw"},
+                              dir);
+  const ToolRun b = RunVoxraw({"from-rinex", GnssDir() + "/30400920.05o",
+                               GnssDir() + "/30400920.05n", "-o", dir + "/3040.raw"},
+                              dir);
+  ASSERT_EQ(a.exit_code, 0) << a.err;
+  ASSERT_EQ(b.exit_code, 0) << b.err;
+  WriteFile(dir + "/job.ini", JobFile("0759.raw", "3040.raw") + "Interval=60\n");
+  const std::string command = std::string("'") + VOXRUN_PATH + "' --quiet '" + dir +
+                              "/job.ini' >'" + dir + "/voxrun.out' 2>&1";
+  const int status = std::system(command.c_str());
+  ASSERT_TRUE(WIFEXITED(status) && WEXITSTATUS(status) == 0) << ReadFile(dir + "/voxrun.out");
+  const tools::ReadResult result = tools::ReadResultFile(dir + "/result.bin");
+  ASSERT_FALSE(result.fault);
+  std::vector<tools::VectorRec> vectors;
+  for (const tools::Record& r : result.records)
+    if (const auto* v = std::get_if<tools::VectorRec>(&r.body)) vectors.push_back(*v);
+  ASSERT_EQ(vectors.size(), 1u);
+  const tools::VectorRec& v = vectors[0];
+  const Xyz expected = {k3040[0] - k0759[0], k3040[1] - k0759[1], k3040[2] - k0759[2]};
+  const double off = Distance({v.baseline[0], v.baseline[1], v.baseline[2]}, expected);
+  std::printf("baseline 0759 -> 3040 at 60 s: %u of 60 epochs, %.3f m from the header difference\n",
+              v.values_80[1], off);
+  EXPECT_EQ(v.values_80[1], 60u) << "common epochs";
+  EXPECT_EQ(v.flags & 3u, 1u) << "not a fixed carrier-phase solution";
+  EXPECT_LT(off, 0.5);
+}
+
 }  // namespace
 }  // namespace vox::test
