@@ -13,6 +13,16 @@ for p in "${packages[@]}"; do
   fi
 done
 
+# node and npm run the independent NMEA parser of the tests (the npm package nmea-simple, which
+# the tests install into the build folder). They count as present when the commands exist,
+# whichever package brought them: a nodejs that bundles npm would conflict with Debian's npm.
+if ! command -v node >/dev/null 2>&1 && ! command -v nodejs >/dev/null 2>&1; then
+  missing+=(nodejs)
+fi
+if ! command -v npm >/dev/null 2>&1; then
+  missing+=(npm)
+fi
+
 if [ ${#missing[@]} -eq 0 ]; then
   exit 0
 fi

@@ -9,6 +9,7 @@
 //   ProbeSlowMs=<ms>       sleep this long in each of 20 work steps
 //   ProbeHonourBreak=1     stop the work steps once _eng_BreakProcess was called
 //   ProbeFail=throw|fault  throw a C++ exception, or write through a null pointer
+//   ProbeResults, ProbeEphemeris, ProbeEpochs: the optional modes of probe_modes.h
 #include <atomic>
 #include <chrono>
 #include <cstdarg>
@@ -19,6 +20,8 @@
 #include <thread>
 #include <vector>
 
+#include "probe_modes.h"
+#include "probe_output.h"
 #include "test_engine.h"
 
 namespace {
@@ -33,40 +36,15 @@ struct ProbeBlock {
   int32_t slow_ms;
   int32_t honour_break;
   int32_t fail;
+  int32_t results;
+  int32_t epochs;
+  char ephemeris[256];
 };
 #pragma pack(pop)
 
 std::atomic<bool> g_break{false};
 
-// The output file, written line by line; threads write through the same file under a lock
-// of their own (stdio locks each call).
-class Output {
- public:
-  explicit Output(const char* path) : file_(*path != '\0' ? std::fopen(path, "w") : nullptr) {}
-  ~Output() {
-    if (file_ != nullptr) std::fclose(file_);
-  }
-  Output(const Output&) = delete;
-  Output& operator=(const Output&) = delete;
-
-  void Line(const char* format, ...)
-#if defined(__GNUC__)
-      __attribute__((format(printf, 2, 3)))
-#endif
-  {
-    if (file_ == nullptr) return;
-    char text[1024];
-    va_list args;
-    va_start(args, format);
-    std::vsnprintf(text, sizeof(text), format, args);
-    va_end(args);
-    std::fprintf(file_, "%s\n", text);
-    std::fflush(file_);
-  }
-
- private:
-  FILE* file_;
-};
+using probe::Output;
 
 void WalkSolution(Output& out) {
   vox_SolutionData data;
@@ -292,8 +270,8 @@ VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_InitParamBlock(ParameterBlock* block) {
 
 VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_EnumParamName(vox_EnumParamCallback callback,
                                                        void* context) {
-  for (const char* name :
-       {"ProbeOut", "ProbeThreads", "ProbeSlowMs", "ProbeHonourBreak", "ProbeFail"})
+  for (const char* name : {"ProbeOut", "ProbeThreads", "ProbeSlowMs", "ProbeHonourBreak",
+                           "ProbeFail", "ProbeResults", "ProbeEphemeris", "ProbeEpochs"})
     callback(context, 0, name);
   return 0;
 }
@@ -306,6 +284,9 @@ VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_SetParam(ParameterBlock* header, const 
   if (std::strcmp(name, "ProbeThreads") == 0) block->threads = std::atoi(value);
   if (std::strcmp(name, "ProbeSlowMs") == 0) block->slow_ms = std::atoi(value);
   if (std::strcmp(name, "ProbeHonourBreak") == 0) block->honour_break = std::atoi(value);
+  if (std::strcmp(name, "ProbeResults") == 0) block->results = std::atoi(value);
+  if (std::strcmp(name, "ProbeEpochs") == 0) block->epochs = std::atoi(value);
+  if (std::strcmp(name, "ProbeEphemeris") == 0) SetText(block->ephemeris, value);
   if (std::strcmp(name, "ProbeFail") == 0) {
     block->fail = std::strcmp(value, "throw") == 0   ? kThrow
                   : std::strcmp(value, "fault") == 0 ? kFault
@@ -343,6 +324,9 @@ VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_ProcessGroup(vox_ThreadContext* context
   StoreNavCoords(out);
   WalkSites(out, "site_after");
   if (block.threads > 0) RunThreads(out, context, block.threads);
+  if (block.results != 0) probe::StoreResults(out, context);
+  if (block.ephemeris[0] != '\0') probe::ReadEphemerides(out, block.ephemeris);
+  if (block.epochs != 0) probe::ReadEpochs(out);
   WorkSteps(out, context, block);
   context->message(context->writer, 1, "probe: end");
   out.Line("end");
