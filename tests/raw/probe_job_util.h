@@ -1,0 +1,65 @@
+// Whole jobs through voxrun with the probe engine (tests/engines/probe_engine.cpp) as the
+// processing engine: running voxrun, and reading the probe's report.
+#pragma once
+
+#include <sys/wait.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstdlib>
+#include <sstream>
+#include <string>
+#include <vector>
+
+namespace vox::test {
+
+#define PROBE_ENGINE_DIR VOX_TEST_ENGINE_DIR "/"
+
+// Runs voxrun on the job file (its output discarded); its exit status is the job's exit code.
+inline int RunVoxrun(const std::string& job) {
+  const pid_t pid = fork();
+  if (pid == 0) {
+    if (freopen("/dev/null", "w", stdout) == nullptr) _exit(126);
+    execl(VOX_VOXRUN, "voxrun", job.c_str(), static_cast<char*>(nullptr));
+    _exit(127);
+  }
+  int status = 0;
+  waitpid(pid, &status, 0);
+  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+}
+
+inline std::vector<std::string> Lines(const std::string& text) {
+  std::vector<std::string> lines;
+  std::istringstream in(text);
+  for (std::string line; std::getline(in, line);)
+    lines.push_back(line);
+  return lines;
+}
+
+// The lines that start with prefix.
+inline std::vector<std::string> WithPrefix(const std::vector<std::string>& lines,
+                                           const std::string& prefix) {
+  std::vector<std::string> out;
+  std::copy_if(lines.begin(), lines.end(), std::back_inserter(out),
+               [&](const std::string& l) { return l.rfind(prefix, 0) == 0; });
+  return out;
+}
+
+// The value of "key=" in a report line ("" when absent); values end at a blank.
+inline std::string Field(const std::string& line, const std::string& key) {
+  const std::string marker = " " + key + "=";
+  size_t at = line.find(marker);
+  if (at == std::string::npos) return "";
+  at += marker.size();
+  return line.substr(at, line.find(' ', at) - at);
+}
+
+inline std::vector<uint8_t> FromHex(const std::string& hex) {
+  std::vector<uint8_t> bytes;
+  for (size_t i = 0; i + 1 < hex.size(); i += 2)
+    bytes.push_back(static_cast<uint8_t>(std::stoul(hex.substr(i, 2), nullptr, 16)));
+  return bytes;
+}
+
+}  // namespace vox::test
