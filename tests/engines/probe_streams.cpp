@@ -151,8 +151,8 @@ void WalkEpochs(Output& out, uint32_t occupation) {
   for (int32_t ok = vox_FindEpoch(stream, nullptr, &epoch); ok != 0;
        ok = vox_GetNextEpoch(stream, &epoch)) {
     ++count;
-    out.Line("epoch occ=%08X t=%u.%03u count=%u one=%u flags=%08X", occupation, epoch.seconds,
-             epoch.ms, epoch.sat_count, epoch.one, epoch.flags);
+    out.Line("epoch occ=%08X t=%u.%03u count=%u one=%u flags=%08X x=%.1f", occupation,
+             epoch.seconds, epoch.ms, epoch.sat_count, epoch.one, epoch.flags, epoch.x);
     for (;;) {
       vox_EpochSatData sat;
       sat.presence = 0xFFFFFFFF;
