@@ -2,6 +2,7 @@
 
 #include <atomic>
 #include <memory>
+#include <mutex>
 
 #include "platform/platform.h"
 
@@ -17,7 +18,17 @@ struct LogFile {
   ~LogFile() { std::fclose(file); }
   FILE* file;
 };
-std::atomic<std::shared_ptr<LogFile>> g_log;
+// g_log is guarded by g_log_mutex, held only to copy or swap the pointer (never while
+// writing or closing a file). Not std::atomic<std::shared_ptr>: the standard library of
+// g++ 12 releases that one's internal lock with relaxed order after a load, which leaves a
+// load and a later store unordered (a data race the thread sanitizer reports).
+std::mutex g_log_mutex;
+std::shared_ptr<LogFile> g_log;
+
+std::shared_ptr<LogFile> CurrentLog() {
+  std::lock_guard lock(g_log_mutex);
+  return g_log;
+}
 // Lets tracing with no log open cost one atomic load.
 std::atomic<bool> g_log_open{false};
 std::atomic<void (*)()> g_pump{nullptr};
@@ -43,14 +54,19 @@ FILE* OpenLogFile(const std::string& path) {
 void ReplaceLog(FILE* file) {
   std::shared_ptr<LogFile> next = file ? std::make_shared<LogFile>(file) : nullptr;
   g_log_open.store(next != nullptr, std::memory_order_release);
-  g_log.store(std::move(next));
+  {
+    std::lock_guard lock(g_log_mutex);
+    g_log.swap(next);
+  }
+  // next now holds the previous log, closed here (outside the lock) unless a writer still
+  // uses it.
 }
 
 }  // namespace
 
 void TraceV(const char* format, va_list arguments) {
   if (format == nullptr || !g_log_open.load(std::memory_order_acquire)) return;
-  const std::shared_ptr<LogFile> log = g_log.load();
+  const std::shared_ptr<LogFile> log = CurrentLog();
   if (log) std::vfprintf(log->file, format, arguments);
 }
 
@@ -86,7 +102,7 @@ void CloseEngineLog() {
 }
 
 bool EngineLogIsOpen() {
-  return g_log.load() != nullptr;
+  return CurrentLog() != nullptr;
 }
 
 FILE* OpenSideLog(std::string* path) {

@@ -81,7 +81,12 @@ bool IsStaticSbas(const vox_EphemerisData& d) {
   if (SystemOf(d.head.sat) != SatSystem::kSbas) return false;
   const vox_SbasEphemeris& s = d.sbas;
   if (s.s3_s5[2] != 0.0 || s.s12 != 0.0f || s.s13 != 0.0f) return false;
-  return std::all_of(std::begin(s.s6_s11), std::end(s.s6_s11), [](float f) { return f == 0.0f; });
+  // Indexed, not through std::begin/std::end: a packed member array cannot bind to a
+  // reference, so each of those would get a temporary copy of its own, and the walk from
+  // one copy to the end of the other reads the stack beyond them.
+  for (size_t i = 0; i < sizeof s.s6_s11 / sizeof s.s6_s11[0]; ++i)
+    if (s.s6_s11[i] != 0.0f) return false;
+  return true;
 }
 
 EphemerisWindow ValidityWindow(const vox_EphemerisData& d) {
