@@ -19,12 +19,25 @@ set(CMAKE_FIND_ROOT_PATH /usr/${VOX_MINGW_TRIPLET})
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)
 set(CMAKE_FIND_ROOT_PATH_MODE_PACKAGE ONLY)
-# Header-only packages of the host (CLI11, nlohmann-json) serve the cross build as well.
+# Header-only packages of the host (CLI11, nlohmann-json) serve the cross build as well, but
+# their own package files would put the host's /usr/include (glibc's headers) on the include
+# path. Stand-ins expose only the packages' own header folders.
 set(CMAKE_FIND_ROOT_PATH_MODE_INCLUDE BOTH)
-foreach(package CLI11 nlohmann_json)
-  if(EXISTS /usr/share/cmake/${package})
-    set(${package}_DIR /usr/share/cmake/${package} CACHE PATH "")
+set(vox_host_packages ${CMAKE_BINARY_DIR}/host-packages)
+foreach(entry "CLI11;CLI11::CLI11;CLI" "nlohmann_json;nlohmann_json::nlohmann_json;nlohmann")
+  list(GET entry 0 package)
+  list(GET entry 1 target)
+  list(GET entry 2 folder)
+  if(EXISTS /usr/include/${folder} AND NOT EXISTS ${vox_host_packages}/${package}Config.cmake)
+    file(MAKE_DIRECTORY ${vox_host_packages}/include)
+    file(CREATE_LINK /usr/include/${folder} ${vox_host_packages}/include/${folder} SYMBOLIC)
+    file(WRITE ${vox_host_packages}/${package}Config.cmake
+      "if(NOT TARGET ${target})\n"
+      "  add_library(${target} INTERFACE IMPORTED)\n"
+      "  set_target_properties(${target} PROPERTIES INTERFACE_INCLUDE_DIRECTORIES ${vox_host_packages}/include)\n"
+      "endif()\n")
   endif()
+  set(${package}_DIR ${vox_host_packages} CACHE PATH "")
 endforeach()
 
 # No libgcc, libstdc++ or winpthread DLL to ship: everything from the compiler is linked in.

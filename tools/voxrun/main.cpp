@@ -7,6 +7,9 @@
 // code. voxrun exits with the job's exit code.
 #include <signal.h>
 #include <unistd.h>
+#ifdef _WIN32
+#include <windows.h>
+#endif
 
 #include <atomic>
 #include <chrono>
@@ -124,10 +127,14 @@ int main(int argc, char** argv) {
   app.add_option("JOBFILE", job_file, "The job file to run")->required();
   CLI11_PARSE(app, argc, argv);
 
+#ifdef _WIN32
+  signal(SIGINT, OnInterrupt);
+#else
   struct sigaction action {};
   action.sa_handler = OnInterrupt;
   sigemptyset(&action.sa_mask);
   sigaction(SIGINT, &action, nullptr);
+#endif
 
   std::vector<const char*> definitions;
   for (const std::string& v : variables)
@@ -151,6 +158,15 @@ int main(int argc, char** argv) {
   std::unique_lock lock(watch.mutex);
   while (!watch.ended) {
     watch.ended_signal.wait_for(lock, std::chrono::milliseconds(100));
+#ifdef _WIN32
+    // The control window lives on this thread, and the job's end waits until it has handled
+    // its close: keep handling its messages.
+    lock.unlock();
+    MSG message;
+    while (PeekMessageA(&message, nullptr, 0, 0, PM_REMOVE))
+      DispatchMessageA(&message);
+    lock.lock();
+#endif
     if (g_interrupts > 0 && !break_sent) {
       SendEngineControl(handle, VOX_CMD_BREAK, 0);
       break_sent = true;
