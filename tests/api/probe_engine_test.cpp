@@ -119,7 +119,7 @@ TEST_F(ProbeEngineTest, WalksEveryStreamAndSeesTheJob) {
   // Vector 2 has no occupations and is not served.
   EXPECT_TRUE(Has(lines,
                   "vector id=08000001 points=01000001,01000003 names=Known,POINT:3 again=1 "
-                  "occups=02000001,02000002,02000003 size=276 same=1"));
+                  "occups=02000001,02000002,02000003 size=412 same=1"));
   EXPECT_EQ(std::count_if(lines.begin(), lines.end(),
                           [](const std::string& l) { return l.rfind("vector ", 0) == 0; }),
             1);

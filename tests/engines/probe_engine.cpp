@@ -38,7 +38,7 @@ struct ProbeBlock {
   int32_t fail;
   int32_t results;
   int32_t epochs;
-  char ephemeris[256];
+  char ephemeris[128];
 };
 #pragma pack(pop)
 
@@ -251,7 +251,8 @@ void WorkSteps(Output& out, const vox_ThreadContext* context, const ProbeBlock& 
   }
 }
 
-void SetText(char (&field)[256], const char* value) {
+template <size_t N>
+void SetText(char (&field)[N], const char* value) {
   std::snprintf(field, sizeof(field), "%s", value);
 }
 
@@ -324,7 +325,7 @@ VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_ProcessGroup(vox_ThreadContext* context
   StoreNavCoords(out);
   WalkSites(out, "site_after");
   if (block.threads > 0) RunThreads(out, context, block.threads);
-  if (block.results != 0) probe::StoreResults(out, context);
+  if (block.results != 0) probe::StoreResults(out, context, block.results);
   if (block.ephemeris[0] != '\0') probe::ReadEphemerides(out, block.ephemeris);
   if (block.epochs != 0) probe::ReadEpochs(out);
   WorkSteps(out, context, block);

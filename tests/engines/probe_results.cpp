@@ -2,6 +2,7 @@
 // (plain forms, Ex forms with the call's writer and with null) and on a thread of its own.
 // Each call's result goes to the report, so that the test can tell a refused call from a
 // record that went missing on its way to the file.
+#include <cmath>
 #include <cstring>
 #include <thread>
 
@@ -69,7 +70,7 @@ void OwnThread(Output& out, const vox_ThreadContext* context) {
 
 }  // namespace
 
-void StoreResults(Output& out, const vox_ThreadContext* context) {
+void StoreResults(Output& out, const vox_ThreadContext* context, int mode) {
   void* writer = context->writer;
   // A solution starts: the writer's plot counter goes to 0; kind 9 then raises it to 1.
   const vox_CopyDataRec start = Solution(2, 0xFFFFFFFF);
@@ -116,6 +117,15 @@ void StoreResults(Output& out, const vox_ThreadContext* context) {
 
   MainPlot(out);
   OwnThread(out, context);
+
+  // Mode 2: last of all, a ray whose position is not a number (a solution that failed).
+  if (mode == 2) {
+    TRayStream* more = vox_OpenRayStream(0x10000001, 0);
+    vox_RayData ray = Ray(3);
+    ray.position[0] = std::nan("");
+    out.Line("results nan_ray=%d", vox_SetNextRay(more, &ray));
+    vox_CloseRayStream(more);
+  }
 }
 
 }  // namespace probe
