@@ -325,10 +325,14 @@ TEST(ProbeEpochJob, APhaseThatIsNotANumberIsDroppedAndTheEpochGoesOn) {
   for (const std::string& text : temp.EngineLogTexts())
     log += text;
   if (WithPrefix(probe, "epochs_done ").empty() && log.find("SIGFPE") != std::string::npos) {
-    GTEST_SKIP() << "library fault: vox_GetEpochDataEx (src/raw/signal_rules.h, InWindow via "
-                    "PhaseValueOk) compares a NaN phase with an ordered comparison, which raises "
-                    "the invalid-operation exception that engine threads unmask; the engine "
-                    "call dies with SIGFPE instead of the value being dropped";
+    GTEST_SKIP() << "library fault: vox_GetEpochDataEx kills the engine call with SIGFPE on "
+                    "a NaN phase: ReadValues (src/raw/raw_codec.h) checks it with PhaseValueOk / "
+                    "InWindow (src/raw/signal_rules.h), whose ordered comparison a >= lo raises "
+                    "the invalid-operation exception that engine threads unmask, instead of "
+                    "dropping the value";
+    the engine
+        "
+        "call dies with SIGFPE instead of the value being dropped";
   }
   const auto sats = WithPrefix(probe, "sat occ=02000001 ");
   ASSERT_EQ(sats.size(), 6u);

@@ -210,22 +210,23 @@ class ProbeResultsJobTest : public ::testing::Test {
   void SetUp() override { Run(1); }
 
   // Runs the job with the probe's results mode (1, or 2 for a last ray that is not a number).
-  void Run(int mode) {
+  void Run(int mode, int version = 101) {
     ASSERT_TRUE(WriteRawFile(scratch_.File("a.raw")));
     ASSERT_TRUE(WriteRawFile(scratch_.File("b.raw")));
-    const std::string job =
-        WriteFile(scratch_.File("job.txt"),
-                  JobText("Results", result_,
-                          "Type=1\nResultVersion=101\nRawfiltPath=" ENGINE_DIR
-                          "test_schedule.eng\nEnginePath=" ENGINE_DIR "test_probe.eng\nProbeOut=" +
-                              probe_ + "\nProbeResults=" + std::to_string(mode) +
-                              "\n"
-                              "NumFiles=2\nNumPoints=2\nNumOccups=2\nNumVectors=1\nNumFans=1\n"
-                              "[FILE:1]\nName=a.raw\n[FILE:2]\nName=b.raw\n"
-                              "[POINT:1]\nName=Base\n[POINT:2]\nName=Rover\n"
-                              "[OCCUP:1]\nFile=1\nPoint=1\n[OCCUP:2]\nFile=2\nPoint=2\n"
-                              "[VECTOR:1]\nPoints=1,2\n"
-                              "[FAN:1]\nPoint=1\nRover=2\nGGAPath=fan.nmea\n"));
+    const std::string job = WriteFile(
+        scratch_.File("job.txt"),
+        JobText("Results", result_,
+                "Type=1\nResultVersion=" + std::to_string(version) +
+                    "\nRawfiltPath=" ENGINE_DIR "test_schedule.eng\nEnginePath=" ENGINE_DIR
+                    "test_probe.eng\nProbeOut=" +
+                    probe_ + "\nProbeResults=" + std::to_string(mode) +
+                    "\n"
+                    "NumFiles=2\nNumPoints=2\nNumOccups=2\nNumVectors=1\nNumFans=1\n"
+                    "[FILE:1]\nName=a.raw\n[FILE:2]\nName=b.raw\n"
+                    "[POINT:1]\nName=Base\n[POINT:2]\nName=Rover\n"
+                    "[OCCUP:1]\nFile=1\nPoint=1\n[OCCUP:2]\nFile=2\nPoint=2\n"
+                    "[VECTOR:1]\nPoints=1,2\n"
+                    "[FAN:1]\nPoint=1\nRover=2\nGGAPath=fan.nmea\n"));
     ASSERT_EQ(RunVoxrun(job), 0);
     read_ = tools::ReadResultFile(result_);
   }
@@ -416,8 +417,10 @@ TEST_F(ProbeNanRayJobTest, IsStoredAndLeftOutOfTheNmeaFile) {
   if (std::find(lines.begin(), lines.end(), "results nan_ray=1") == lines.end() &&
       log.find("SIGFPE") != std::string::npos) {
     GTEST_SKIP() << "library fault: vox_SetNextRay with a NaN position kills the engine call "
-                    "with SIGFPE (the NMEA writer compares the NaN under the engine threads' "
-                    "floating-point mode, which unmasks invalid operations)";
+                    "with SIGFPE: FormatNmeaFix (src/results/nmea_writer.cpp) converts the "
+                    "position with CartesianToGeodetic (src/base/ellipsoid.cpp), whose ordered "
+                    "comparison p < kAxisDistance raises the invalid-operation exception that "
+                    "engine threads unmask, before its own isfinite check is reached";
   }
   EXPECT_EQ(lines.back(), "end");
   size_t rays = 0;
@@ -425,6 +428,60 @@ TEST_F(ProbeNanRayJobTest, IsStoredAndLeftOutOfTheNmeaFile) {
     rays += r.kind == 36;
   EXPECT_EQ(rays, 4u);
   EXPECT_EQ(Lines(ReadFile(scratch_.File("fan.nmea"))).size(), 4u);
+}
+
+// With result version 100 the plot streams write the older records: line descriptions of kind
+// 4, epochs of kind 37 that carry each value's line flags and one-byte satellites, so that a
+// value on a line whose satellite does not fit a byte (GALILEO, BDS) is dropped.
+class ProbeResultsV100JobTest : public ProbeResultsJobTest {
+ protected:
+  void SetUp() override { Run(1, 100); }
+};
+
+TEST_F(ProbeResultsV100JobTest, PlotStreamsWriteTheOlderRecords) {
+  ASSERT_FALSE(read_.fault) << read_.fault->what;
+  const std::vector<Record> r = EngineRecords();
+  const uint8_t kinds[] = {30, 39, 38, 52, 55, 33, 40, 40, 35, 41, 36, 36,
+                           36, 4,  4,  4,  4,  37, 37, 30, 55, 39, 4,  37};
+  std::vector<uint8_t> got;
+  for (const Record& rec : r)
+    got.push_back(rec.kind);
+  ASSERT_EQ(got, std::vector<uint8_t>(std::begin(kinds), std::end(kinds)));
+  const PlotLine* lines[5] = {&kMainLines[0], &kMainLines[1], &kMainLines[2], &kMainLines[3],
+                              &kThreadLine};
+  const size_t at[5] = {13, 14, 15, 16, 22};
+  for (size_t i = 0; i < 5; ++i) {
+    const auto& l = std::get<tools::PlotLineRec>(r[at[i]].body);
+    EXPECT_FALSE(l.v101);
+    EXPECT_EQ(l.index, lines[i]->index);
+    EXPECT_EQ(l.value, 3);
+    EXPECT_EQ(l.name, lines[i]->name);
+  }
+  struct Value {
+    uint16_t flags;
+    uint8_t a, b;
+    float value;
+  };
+  auto expect_epoch = [](const Record& rec, uint16_t stream, double time,
+                         const std::vector<Value>& values) {
+    const auto& e = std::get<tools::PlotEpochRec>(rec.body);
+    EXPECT_FALSE(e.v101);
+    const uint64_t ms = static_cast<uint64_t>(std::llround(time * 1000.0));
+    EXPECT_EQ(e.time.ms_of_day, ms % 86400000);
+    EXPECT_EQ(e.stream_id, stream);
+    ASSERT_EQ(e.values.size(), values.size());
+    for (size_t i = 0; i < values.size(); ++i) {
+      EXPECT_EQ(e.values[i].flags, values[i].flags);
+      EXPECT_EQ(e.values[i].sat_a, values[i].a);
+      EXPECT_EQ(e.values[i].sat_b, values[i].b);
+      EXPECT_EQ(e.values[i].value, values[i].value);
+    }
+  };
+  expect_epoch(r[17], 2, kPlotTime, {{0x311, 5, 12, 1.5f}, {0x422, 135, 0, 2.5f}});
+  // E11 (267) does not fit a byte: only line 7 remains.
+  expect_epoch(r[18], 2, kPlotTime + 1.0, {{0x4007, 0, 0, 7.5f}});
+  // The thread's C03-C04 line loses its only value; the epoch is still written, empty.
+  expect_epoch(r[23], 1, kPlotTime + 9.0, {});
 }
 
 }  // namespace
