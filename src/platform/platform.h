@@ -77,6 +77,12 @@ class ThreadLocalSlot {
 
 // ---------------------------------------------------------------- dynamic libraries
 
+// The system's headers on Windows make LoadLibrary a macro; this interface's function keeps
+// its own name wherever both are included.
+#ifdef LoadLibrary
+#undef LoadLibrary
+#endif
+
 struct Library;  // opaque
 // Loads the library at path; null on failure (LastLibraryError() then says why).
 Library* LoadLibrary(const std::string& path);
@@ -184,6 +190,22 @@ std::string PathFromWide(const wchar_t* wide);
 void SetEngineFloatingPointMode();
 // Restores the default mode (all exceptions masked) on the calling thread.
 void RestoreDefaultFloatingPointMode();
+
+// Masks every floating-point exception on the calling thread for the life of the object and
+// then restores the mode and flags as they were. Library code that an engine calls runs under
+// it: an engine thread traps on invalid operations, and a value that is not a number (read
+// from a file or handed over by the engine) must be handled as data by the library, not end
+// the engine's call in the middle of a library function.
+class QuietFloatingPoint {
+ public:
+  QuietFloatingPoint();
+  ~QuietFloatingPoint();
+  QuietFloatingPoint(const QuietFloatingPoint&) = delete;
+  QuietFloatingPoint& operator=(const QuietFloatingPoint&) = delete;
+
+ private:
+  alignas(16) unsigned char saved_[64];  // the platform's saved floating-point state
+};
 
 // ---------------------------------------------------------------- fault guard
 
