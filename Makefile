@@ -2,7 +2,7 @@
 BUILD ?= build
 JOBS ?= $(shell nproc)
 
-.PHONY: all deps configure build test demo install clean test-asan test-tsan fuzz bench
+.PHONY: all deps configure build test demo install clean test-asan test-tsan fuzz bench test-windows
 
 all: build
 
@@ -59,3 +59,8 @@ fuzz: deps
 # The benchmarks with their references, as one table (build-bench).
 bench: deps
 	@scripts/bench.sh
+
+# ---- Windows x64: cross-build with MinGW-w64 into build-win and run the Windows tests under
+# Wine (installs the cross compiler and Wine when missing).
+test-windows:
+	@scripts/test-windows.sh build-win
