@@ -2,6 +2,7 @@
 // it carries are written by the NMEA writer of the results room. None of them traces.
 #include <new>
 
+#include "platform/platform.h"
 #include "raw/epoch_stream.h"
 #include "results/nmea_writer.h"
 #include "run/current_task.h"
@@ -32,22 +33,26 @@ VOX_API void* VOX_CALL vox_OpenEpochStream(uint32_t occupation_id, uint32_t inte
 }
 
 VOX_API int32_t VOX_CALL vox_FindEpoch(void* stream, const TimeMs* time, vox_EpochData* out) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (stream == nullptr || out == nullptr) return 0;
   return StreamOf(stream)->Find(time, *out) ? 1 : 0;
 }
 
 VOX_API int32_t VOX_CALL vox_GetNextEpoch(void* stream, vox_EpochData* out) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (stream == nullptr || out == nullptr) return 0;
   return StreamOf(stream)->GetNext(*out) ? 1 : 0;
 }
 
 VOX_API int32_t VOX_CALL vox_GetEpochDataEx(void* stream, vox_EpochSatData* out) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (stream == nullptr || out == nullptr) return 0;
   return StreamOf(stream)->GetSatellite(*out) ? 1 : 0;
 }
 
 VOX_API int32_t VOX_CALL vox_SetEpochNavSolutionEx(void* stream,
                                                    const vox_NavSolutionData* solution) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (stream == nullptr || solution == nullptr) return 0;
   vox::EpochStream* s = StreamOf(stream);
   vox::TBufFile* output = s->NavOutput(vox::kNmeaOpenMode);

@@ -1,6 +1,7 @@
 // Exported meteorological stream functions over the task's tracks. None of them traces.
 #include <new>
 
+#include "platform/platform.h"
 #include "raw/meteo_stream.h"
 #include "run/current_task.h"
 #include "run/task.h"
@@ -19,6 +20,7 @@ VOX_API void* VOX_CALL vox_OpenMeteoStream(uint32_t file_id) {
 }
 
 VOX_API int32_t VOX_CALL vox_GetMeteoData(void* stream, const TimeMs* time, vox_MeteoData* out) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (stream == nullptr || time == nullptr || out == nullptr) return 0;
   return vox::QueryMeteo(*static_cast<vox::MeteoCursor*>(stream), *time, *out) ? 1 : 0;
 }

@@ -7,6 +7,7 @@
 #include "job/navigation_mean.h"
 #include "job/occupation_records.h"
 #include "job/record_text.h"
+#include "platform/platform.h"
 #include "run/current_task.h"
 #include "run/task.h"
 #include "vox/vox_sdk_streams.h"
@@ -168,6 +169,7 @@ VOX_API int32_t VOX_CALL vox_GetTrackData(vox_TrackData* record) {
 }
 
 VOX_API int32_t VOX_CALL vox_GetNavCoord(uint32_t occupation_id, vox_NavCoordData* out) {
+  const vox::platform::QuietFloatingPoint quiet;
   vox::Trace("get occupation coord #%08X\n", occupation_id);
   vox::TTask* task = vox::CurrentTask();
   if (out == nullptr || task == nullptr) return 0;
@@ -180,6 +182,7 @@ VOX_API int32_t VOX_CALL vox_GetNavCoord(uint32_t occupation_id, vox_NavCoordDat
 }
 
 VOX_API int32_t VOX_CALL vox_SetNavCoord(uint32_t occupation_id, const vox_NavCoordData* in) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (in == nullptr) return 0;
   vox::Trace("set occupation coord #%08X\n", occupation_id);
   vox::TTask* task = vox::CurrentTask();

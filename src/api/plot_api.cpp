@@ -1,6 +1,7 @@
 // The engine's plot stream functions. None of them writes a trace line.
 #include <memory>
 
+#include "platform/platform.h"
 #include "results/plot_stream.h"
 #include "run/current_task.h"
 #include "run/task.h"
@@ -44,11 +45,13 @@ VOX_API int32_t VOX_CALL vox_CreatePlot(vox_PlotStream* stream, uint32_t /*unuse
 
 VOX_API int32_t VOX_CALL vox_SendData(vox_PlotStream* stream, int32_t index, uint32_t epoch,
                                       double value) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (stream == nullptr) return 0;
   return StreamOf(stream)->SendData(static_cast<uint32_t>(index), epoch, value);
 }
 
 VOX_API int32_t VOX_CALL vox_ClosePlotStream(vox_PlotStream* stream) {
+  const vox::platform::QuietFloatingPoint quiet;
   return vox::ClosePlotStream(StreamOf(stream));
 }
 

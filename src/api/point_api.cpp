@@ -4,6 +4,7 @@
 
 #include "base/engine_log.h"
 #include "job/site_records.h"
+#include "platform/platform.h"
 #include "run/current_task.h"
 #include "run/task.h"
 #include "vox/vox_sdk_streams.h"
@@ -30,6 +31,7 @@ VOX_API void VOX_CALL vox_ClosePointStream(void* stream) {
 }
 
 VOX_API int32_t VOX_CALL vox_GetSiteData(vox_SiteData* record) {
+  const vox::platform::QuietFloatingPoint quiet;
   vox::Trace("get site data\n");
   vox::TTask* task = vox::CurrentTask();
   if (record == nullptr || task == nullptr) return 0;

@@ -1,6 +1,7 @@
 // The engine's result functions: resolve the task and the writer, then hand over to the
 // results room. A null writer in the Ex forms means the task's own writer.
 #include "base/engine_log.h"
+#include "platform/platform.h"
 #include "results/ray_stream.h"
 #include "results/result_functions.h"
 #include "run/current_task.h"
@@ -25,6 +26,7 @@ extern "C" {
 
 VOX_API int32_t VOX_CALL vox_SetVectorResultEx(void* writer, uint32_t vector_id,
                                                const vox_VectorResult* result) {
+  const vox::platform::QuietFloatingPoint quiet;
   vox::Trace("set vector result #%08X\n", vector_id);
   vox::TTask* task = vox::CurrentTask();
   if (task == nullptr) return 0;
@@ -40,6 +42,7 @@ VOX_API int32_t VOX_CALL vox_SetVectorResult(uint32_t vector_id, const vox_Vecto
 
 VOX_API int32_t VOX_CALL vox_SetFanResultEx(void* writer, uint32_t fan_id,
                                             const vox_FanResult* result) {
+  const vox::platform::QuietFloatingPoint quiet;
   vox::TTask* task = vox::CurrentTask();
   if (task == nullptr) return 0;
   vox::TFanItem* fan = task->job.FindFan(fan_id);
@@ -53,6 +56,7 @@ VOX_API int32_t VOX_CALL vox_SetFanResult(uint32_t fan_id, const vox_FanResult* 
 
 VOX_API int32_t VOX_CALL vox_SetNextRayEx(void* writer, TRayStream* stream,
                                           const vox_RayData* ray) {
+  const vox::platform::QuietFloatingPoint quiet;
   if (stream == nullptr) return 0;
   vox::TResultFile* w = WriterOf(writer, vox::CurrentTask());
   if (w == nullptr) return 0;
@@ -65,6 +69,7 @@ VOX_API int32_t VOX_CALL vox_SetNextRay(TRayStream* stream, const vox_RayData* r
 
 VOX_API int32_t VOX_CALL vox_CopyDataEx(void* writer, uint32_t kind, const vox_CopyDataRec* record,
                                         uint32_t size) {
+  const vox::platform::QuietFloatingPoint quiet;
   vox::TTask* task = vox::CurrentTask();
   vox::TResultFile* w = WriterOf(writer, task);
   if (w == nullptr) return 0;
