@@ -170,9 +170,13 @@ void WalkEpochs(Output& out, uint32_t occupation) {
                sat.b3, sat.presence, values.c_str());
     }
   }
+  // In this order: as arguments of one call the two could run the other way round, and a
+  // read after the close uses a freed stream.
   vox_EpochSatData after;
-  out.Line("epochs_done occ=%08X count=%zu after=%d close=%d", occupation, count,
-           vox_GetEpochDataEx(stream, &after), vox_CloseEpochStream(stream));
+  const int read_after = vox_GetEpochDataEx(stream, &after);
+  const int closed = vox_CloseEpochStream(stream);
+  out.Line("epochs_done occ=%08X count=%zu after=%d close=%d", occupation, count, read_after,
+           closed);
 }
 
 }  // namespace

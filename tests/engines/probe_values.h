@@ -75,7 +75,7 @@ inline vox_RayData Ray(uint32_t k) {
   for (int i = 0; i < 3; ++i)
     r.position[i] = kFan2[i] + (k + 1.0) * (i + 1);
   r.values[0] = 100 + k, r.values[1] = 200 + k, r.values[2] = 300 + k;
-  r.flags = kRayFlags[k];
+  r.flags = kRayFlags[k % 3];  // the extra ray of results mode 2 is Ray(3)
   r.hdop = 0.5f + k;
   r.satellites = 7 + k;
   return r;
