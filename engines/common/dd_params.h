@@ -71,3 +71,24 @@ DdParams ItemDdParams(Getter get, uint32_t item_id) {
 }
 
 }  // namespace voxeng
+
+// The four parameter-block exports of an engine whose parameters are DdParams (the static and
+// the kinematic engine): one definition, expanded once at file scope in each engine.
+#define VOXENG_EXPORT_DD_PARAMETERS()                                                           \
+  VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetParamBlockSize(void) {                            \
+    return sizeof(voxeng::DdParams);                                                            \
+  }                                                                                             \
+  VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_InitParamBlock(ParameterBlock* block) {              \
+    if (block == nullptr || block->allocated < sizeof(voxeng::DdParams)) return 0;              \
+    voxeng::InitDdParams(*reinterpret_cast<voxeng::DdParams*>(block));                          \
+    return 1;                                                                                   \
+  }                                                                                             \
+  VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_EnumParamName(vox_EnumParamCallback callback,        \
+                                                         void* context) {                       \
+    voxeng::EnumDdParams(callback, context);                                                    \
+    return 1;                                                                                   \
+  }                                                                                             \
+  VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_SetParam(ParameterBlock* block, const char* name,    \
+                                                    const char* value) {                        \
+    return voxeng::SetDdParam(block, name, value) ? 1 : 0;                                      \
+  }

@@ -328,23 +328,7 @@ VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetEngineCapability(void) {
 VOX_ENGINE_EXPORT const char* VOX_CALL _eng_GetEngineDescription(void) {
   return "Static GPS baselines from double differences (code, float and fixed L1 phase)";
 }
-VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetParamBlockSize(void) {
-  return sizeof(DdParams);
-}
-VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_InitParamBlock(ParameterBlock* block) {
-  if (block == nullptr || block->allocated < sizeof(DdParams)) return 0;
-  InitDdParams(*reinterpret_cast<DdParams*>(block));
-  return 1;
-}
-VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_EnumParamName(vox_EnumParamCallback callback,
-                                                       void* context) {
-  EnumDdParams(callback, context);
-  return 1;
-}
-VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_SetParam(ParameterBlock* block, const char* name,
-                                                  const char* value) {
-  return SetDdParam(block, name, value) ? 1 : 0;
-}
+VOXENG_EXPORT_DD_PARAMETERS()
 VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_BreakProcess(void) {
   g_stop.Request();
   return 1;
