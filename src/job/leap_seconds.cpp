@@ -1,5 +1,6 @@
 #include "job/leap_seconds.h"
 
+#include <algorithm>
 #include <cmath>
 #include <string>
 
@@ -75,8 +76,13 @@ uint32_t DecimalYearToGps(double year) {
 bool ReadLeapSection(JobSection& reader) {
   TLockGuard guard(TableLock());
   if (!reader.FindSection("LEAP_SEC")) return false;
-  const int32_t count = reader.GetInt("Num", 0);
+  int32_t count = reader.GetInt("Num", 0);
   if (count == 0) return false;
+  // An entry takes at least two bytes of the section ("0="), so no key past the section's
+  // length can exist: a huge Num would otherwise keep the job thread looking up and tracing
+  // billions of missing entries.
+  const int32_t end = reader.end() >= 0 ? reader.end() : static_cast<int32_t>(reader.text().size());
+  if (reader.start() >= 0 && end >= reader.start()) count = std::min(count, end - reader.start());
 
   std::vector<LeapEntry> entries;
   int32_t ignored = 0;
