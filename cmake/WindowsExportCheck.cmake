@@ -3,20 +3,18 @@
 #   [-DENGINE=<an engine library> -DENGINE_NAMES=<names it must export, ;-separated>]
 # Every listed name must be exported exactly as written (no stdcall "@n" decoration, no
 # leading underscore added), and nothing else may be exported.
+cmake_minimum_required(VERSION 3.25)
+
 function(read_exports file out)
   execute_process(COMMAND ${OBJDUMP} -p ${file} OUTPUT_VARIABLE dump RESULT_VARIABLE failed)
   if(failed)
     message(FATAL_ERROR "${OBJDUMP} -p ${file} failed")
   endif()
+  # The table's lines read "[  n] name" after a tab; square brackets would confuse CMake's lists, so
+  # the lines become names before anything is split.
   string(REGEX MATCH "\\[Ordinal/Name Pointer\\] Table\n([^\n]+\n)+" table "${dump}")
-  string(REGEX MATCHALL "\\] [^\n]+" entries "${table}")
-  set(names)
-  foreach(entry IN LISTS entries)
-    string(REGEX REPLACE "^\\] " "" name "${entry}")
-    if(NOT name STREQUAL "" AND NOT name MATCHES "Table$")
-      list(APPEND names "${name}")
-    endif()
-  endforeach()
+  string(REPLACE "[Ordinal/Name Pointer] Table\n" "" table "${table}")
+  string(REGEX REPLACE "[^\n]*\\[ *[0-9]+\\] ([^\n]+)\n" "\\1;" names "${table}")
   set(${out} ${names} PARENT_SCOPE)
 endfunction()
 

@@ -23,10 +23,28 @@ set(CMAKE_GTEST_DISCOVER_TESTS_DISCOVERY_MODE PRE_TEST)
 
 get_filename_component(VOX_SHARED_DIR "${PROJECT_SOURCE_DIR}/../shared" ABSOLUTE)
 
+# Programs that need POSIX-only facilities; they are defined (so that their rooms' CMake
+# files stay as they are) but neither built nor run here.
+#   buf_file_test              resource limits (setrlimit) for failing writes
+#   engine_example_job_test    runs programs and reads their wait status
+#   raw_probe_job_test         forks a child per job
+#   results_test               forks to check output a crash leaves behind
+#   results_reader_test        runs voxdump and reads its wait status
+#   engines_reference_test     edits voxsim's job file by its LF line ends (CR LF on Windows)
+#   results_probe_job_test     (listed for completeness; defined by its room directly)
+set(VOX_WINDOWS_EXCLUDED_TESTS engines_reference_test buf_file_test engine_example_job_test raw_probe_job_test
+  results_test results_reader_test results_probe_job_test)
+
 # vox_test(NAME SOURCES...): as on Linux, but one ctest entry per program.
 function(vox_test name)
+  if(name IN_LIST VOX_WINDOWS_EXCLUDED_TESTS)
+    add_executable(${name} EXCLUDE_FROM_ALL ${ARGN})
+    target_link_libraries(${name} PRIVATE vox_internal GTest::gtest GTest::gmock GTest::gtest_main)
+    return()
+  endif()
   add_executable(${name} ${ARGN})
   target_link_libraries(${name} PRIVATE vox_internal GTest::gtest GTest::gmock GTest::gtest_main)
+  target_compile_options(${name} PRIVATE -include ${PROJECT_SOURCE_DIR}/tests/windows/posix_shims.h)
   if(TARGET vox_test_support)
     target_link_libraries(${name} PRIVATE vox_test_support)
   endif()
@@ -41,4 +59,16 @@ endfunction()
 add_custom_target(vox_threaded_tests)
 
 set(tests_dir ${PROJECT_SOURCE_DIR}/tests)
+add_subdirectory(${tests_dir}/support ${PROJECT_BINARY_DIR}/tests/support)
+add_subdirectory(${tests_dir}/engines ${PROJECT_BINARY_DIR}/tests/engines)
+foreach(room base job engine raw results)
+  add_subdirectory(${tests_dir}/${room} ${PROJECT_BINARY_DIR}/tests/${room})
+endforeach()
+# Two more programs of that kind that the rooms define themselves (run voxrun and read its
+# wait status): kept out of the build. Their cases carry no "windows" label.
+foreach(name engine_example_job_test results_probe_job_test)
+  if(TARGET ${name})
+    set_target_properties(${name} PROPERTIES EXCLUDE_FROM_ALL ON)
+  endif()
+endforeach()
 add_subdirectory(${tests_dir}/windows ${PROJECT_BINARY_DIR}/tests/windows)

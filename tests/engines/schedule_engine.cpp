@@ -16,7 +16,11 @@
 // "stack <role> free=<bytes below the engine's first frame>", "group <role> ...",
 // "groupMT <role> ...", "break <role>". Each occupation call also writes the messages
 // "begin <n>" and "end <n>" through its writer.
+#ifdef _WIN32
+#include <windows.h>
+#else
 #include <pthread.h>
+#endif
 
 #include <atomic>
 #include <chrono>
@@ -44,6 +48,12 @@ void Line(const char* format, Args... args) {
 
 // Bytes of stack left below this frame on the calling thread.
 size_t StackFree() {
+#ifdef _WIN32
+  ULONG_PTR low = 0, high = 0;
+  GetCurrentThreadStackLimits(&low, &high);
+  char here = 0;
+  return static_cast<size_t>(reinterpret_cast<ULONG_PTR>(&here) - low);
+#else
   pthread_attr_t attributes;
   if (pthread_getattr_np(pthread_self(), &attributes) != 0) return 0;
   void* base = nullptr;
@@ -52,6 +62,7 @@ size_t StackFree() {
   pthread_attr_destroy(&attributes);
   char here = 0;
   return static_cast<size_t>(&here - static_cast<char*>(base));
+#endif
 }
 
 // Touches k KiB of stack so that a stack too small for it faults.

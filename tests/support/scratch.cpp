@@ -5,15 +5,49 @@
 #include <fstream>
 #include <sstream>
 
+#ifdef _WIN32
+#include <random>
+#endif
+
 namespace fs = std::filesystem;
 
 namespace vox::test {
 
-ScratchDir::ScratchDir() {
+namespace {
+
+#ifdef _WIN32
+// Windows has no mkdtemp and no setenv, and takes its temporary folder from TMP and TEMP.
+fs::path MakeUniqueFolder() {
+  std::random_device seed;
+  for (int attempt = 0; attempt < 100; ++attempt) {
+    fs::path candidate = fs::temp_directory_path() / ("vox-test-" + std::to_string(seed()));
+    if (fs::create_directory(candidate)) return candidate;
+  }
+  throw std::runtime_error("no unique scratch folder");
+}
+void SetTempFolder(const char* value) {
+  _putenv_s("TMP", value != nullptr ? value : "");
+  _putenv_s("TEMP", value != nullptr ? value : "");
+}
+const char* kTempVariable = "TMP";
+#else
+fs::path MakeUniqueFolder() {
   std::string pattern = (fs::temp_directory_path() / "vox-test-XXXXXX").string();
   if (mkdtemp(pattern.data()) == nullptr) throw std::runtime_error("mkdtemp failed");
-  path_ = pattern;
+  return pattern;
 }
+void SetTempFolder(const char* value) {
+  if (value != nullptr)
+    setenv("TMPDIR", value, 1);
+  else
+    unsetenv("TMPDIR");
+}
+const char* kTempVariable = "TMPDIR";
+#endif
+
+}  // namespace
+
+ScratchDir::ScratchDir() : path_(MakeUniqueFolder()) {}
 
 ScratchDir::~ScratchDir() {
   std::error_code ignored;
@@ -46,15 +80,12 @@ TempDirEnv::TempDirEnv(const ScratchDir& scratch, bool with_engine_folder)
     : temp_(scratch.path() / "tmp") {
   fs::create_directories(temp_);
   if (with_engine_folder) fs::create_directories(temp_ / "engine");
-  if (const char* old = std::getenv("TMPDIR")) previous_ = old;
-  setenv("TMPDIR", temp_.c_str(), 1);
+  if (const char* old = std::getenv(kTempVariable)) previous_ = old;
+  SetTempFolder(temp_.string().c_str());
 }
 
 TempDirEnv::~TempDirEnv() {
-  if (previous_)
-    setenv("TMPDIR", previous_->c_str(), 1);
-  else
-    unsetenv("TMPDIR");
+  SetTempFolder(previous_ ? previous_->c_str() : nullptr);
 }
 
 namespace {
