@@ -1,6 +1,8 @@
 // Intrusive singly linked lists of job items: Link<T> is the base of every item class T, and
-// ItemList<T> is a head pointer that owns (or only references) its items. Job lists are short
-// and built once, so appending walks to the tail.
+// ItemList<T> is a head pointer that owns (or only references) its items. The list remembers
+// its last item, so that a job of many thousand points is not built in quadratic time; an
+// item linked in by hand after the remembered one (the ephemeris store inserts in time order)
+// is found by walking on from it, since items leave a list only when it is cleared.
 #pragma once
 
 #include <cstddef>
@@ -25,7 +27,9 @@ class ItemList {
   ItemList(const ItemList&) = delete;
   ItemList& operator=(const ItemList&) = delete;
   ItemList(ItemList&& other) noexcept
-      : head_(std::exchange(other.head_, nullptr)), owning_(other.owning_) {}
+      : head_(std::exchange(other.head_, nullptr)),
+        tail_(std::exchange(other.tail_, nullptr)),
+        owning_(other.owning_) {}
 
   T* head() const { return head_; }
   bool empty() const { return head_ == nullptr; }
@@ -34,9 +38,14 @@ class ItemList {
   T* Append(T* item) {
     if (item == nullptr) return nullptr;
     item->next = nullptr;
-    T** slot = &head_;
-    while (*slot != nullptr) slot = &(*slot)->next;
-    *slot = item;
+    if (head_ == nullptr) {
+      head_ = tail_ = item;
+      return item;
+    }
+    T* last = tail_ != nullptr ? tail_ : head_;
+    while (last->next != nullptr) last = last->next;
+    last->next = item;
+    tail_ = item;
     return item;
   }
   T* Append(std::unique_ptr<T> item) { return Append(item.release()); }
@@ -46,6 +55,7 @@ class ItemList {
     if (item == nullptr) return nullptr;
     item->next = head_;
     head_ = item;
+    if (tail_ == nullptr) tail_ = item;
     return item;
   }
 
@@ -66,6 +76,7 @@ class ItemList {
   void Clear() {
     T* p = head_;
     head_ = nullptr;
+    tail_ = nullptr;
     while (p != nullptr) {
       T* next = p->next;
       p->next = nullptr;
@@ -103,6 +114,7 @@ class ItemList {
 
  private:
   T* head_ = nullptr;
+  T* tail_ = nullptr;  // the last item appended or prepended to an empty list
   bool owning_;
 };
 

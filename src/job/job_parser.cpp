@@ -76,15 +76,28 @@ void ReadJobHead(Context& c) {
   }
 }
 
+// The most items of one kind a job may name. Item numbers share their identifier with a type
+// tag in the top byte, and each number costs a search of the whole job text, so an absurd
+// count (a typo or a damaged file) would otherwise stall the job thread or exhaust memory;
+// real surveys stay far below it.
+constexpr int32_t kMaxItemsPerKind = 65535;
+
+int32_t ReadCount(JobSection& r, const char* key) {
+  const int32_t count = r.GetInt(key, 0);
+  if (count <= kMaxItemsPerKind) return count;
+  Trace("%s=%d limited to %d\n", key, count, kMaxItemsPerKind);
+  return kMaxItemsPerKind;
+}
+
 void ReadJobCounts(Context& c) {
   JobSection& r = c.reader;
-  c.counts.files = r.GetInt("NumFiles", 0);
-  c.counts.points = r.GetInt("NumPoints", 0);
-  c.counts.occups = r.GetInt("NumOccups", 0);
-  c.counts.vectors = r.GetInt("NumVectors", 0);
-  c.counts.fans = r.GetInt("NumFans", 0);
-  c.counts.antennas = r.GetInt("NumAntennas", 0);
-  c.counts.receivers = r.GetInt("NumReceivers", 0);
+  c.counts.files = ReadCount(r, "NumFiles");
+  c.counts.points = ReadCount(r, "NumPoints");
+  c.counts.occups = ReadCount(r, "NumOccups");
+  c.counts.vectors = ReadCount(r, "NumVectors");
+  c.counts.fans = ReadCount(r, "NumFans");
+  c.counts.antennas = ReadCount(r, "NumAntennas");
+  c.counts.receivers = ReadCount(r, "NumReceivers");
 }
 
 void ReadJobControl(Context& c) {

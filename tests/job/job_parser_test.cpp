@@ -142,6 +142,18 @@ TEST_F(JobParserTest, NumCpusIsClampedAndDefaultsToTheCallersCount) {
   EXPECT_EQ(absent.thread_count, 6u);
 }
 
+// A count far beyond any survey (a typo, a damaged file) is limited, with a trace line, so
+// that the parse neither stalls over billions of section searches nor exhausts memory.
+TEST_F(JobParserTest, AbsurdItemCountsAreLimited) {
+  testing::TraceCapture trace;
+  ASSERT_TRUE(Parse("[JOB]\nNumPoints=2000000000\nNumFans=1999999999\nNumFiles=65535\n"));
+  EXPECT_EQ(model.points.Count(), 65535u);
+  EXPECT_EQ(model.points.FindById(kPointTag + 65535)->name, "POINT:65535");
+  EXPECT_NE(trace.Text().find("NumPoints=2000000000 limited to 65535\n"), std::string::npos);
+  EXPECT_NE(trace.Text().find("NumFans=1999999999 limited to 65535\n"), std::string::npos);
+  EXPECT_EQ(trace.Text().find("NumFiles="), std::string::npos);
+}
+
 TEST_F(JobParserTest, ControlFlagsAndScalars) {
   ASSERT_TRUE(Parse("[JOB]\nProcessControlFlags=7\nMaxExtraBases=-3\nResultVersion=101\n"));
   EXPECT_EQ(model.engine_flags, 6u);
