@@ -16,7 +16,7 @@ namespace test_engine {
 inline void Record(const char* format, ...) {
   const char* path = std::getenv("VOX_TEST_RECORD");
   if (path == nullptr || *path == '\0') return;
-  FILE* file = std::fopen(path, "a");
+  FILE* file = std::fopen(path, "ab");  // binary: the same LF line ends on every OS
   if (file == nullptr) return;
   va_list args;
   va_start(args, format);

@@ -113,8 +113,13 @@ std::vector<std::string> TempDirEnv::EngineLogs() const {
 
 std::vector<std::string> TempDirEnv::EngineLogTexts() const {
   std::vector<std::string> texts;
-  for (const std::string& path : EngineLogs())
+  for (const std::string& path : EngineLogs()) {
     texts.push_back(ReadFile(path));
+#ifdef _WIN32
+    // The engine log is a text file: Windows writes each line feed as CR LF.
+    std::erase(texts.back(), '\r');
+#endif
+  }
   return texts;
 }
 

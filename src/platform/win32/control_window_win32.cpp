@@ -7,6 +7,7 @@
 // Commands 0 (break) and 1 (pause) release the sender at once with ReplyMessage; a pause then
 // keeps the window thread in the pause loop, handling messages, until the pause flag is
 // cleared or the window is closed (a pause cannot outlive its window: nothing could lift it).
+// A pause sent by the window thread to itself only raises the flag.
 //
 // State: the open window, the latest window and the dialog window are atomics written on
 // the window thread (and by CloseControlWindow); the title is guarded by a mutex.
@@ -102,9 +103,12 @@ LRESULT CALLBACK WindowProc(HWND window, UINT message, WPARAM w_param, LPARAM l_
       return 0;
     }
     if (command == 1) {
+      // A pause sent from the window thread itself cannot be held there: nothing on that
+      // thread could ever send the resume. It only raises the flag, as on POSIX.
+      const bool from_another_thread = InSendMessage() != FALSE;
       ReplyMessage(1);
       Execute(command, argument);
-      PauseLoop(window);
+      if (from_another_thread) PauseLoop(window);
       return 1;
     }
     return static_cast<LRESULT>(Execute(command, argument));
