@@ -90,32 +90,39 @@ int FullYear(int year) {
 // ---------------------------------------------------------------------------------------------
 // Observation files
 
-ObsReader::ObsReader(const std::string& path) : path_(path), in_(path) {
+RinexFile::RinexFile(const std::string& path) : path_(path), in_(path) {
   if (!in_) throw RinexError(path, 0, "cannot open the file");
-  ReadHeader();
 }
 
-bool ObsReader::GetLine(std::string& line) {
+bool RinexFile::GetLine(std::string& line) {
   if (!std::getline(in_, line)) return false;
   ++line_no_;
   if (!line.empty() && line.back() == '\r') line.pop_back();
   return true;
 }
 
-void ObsReader::Fail(const std::string& what) const {
+void RinexFile::Fail(const std::string& what) const {
   throw RinexError(path_, line_no_, what);
 }
 
-void ObsReader::ReadHeader() {
-  std::string line;
+double RinexFile::ReadVersionLine(std::string& line) {
   if (!GetLine(line)) Fail("empty file");
   if (Label(line) != "RINEX VERSION / TYPE")
     Fail("not a RINEX file: RINEX VERSION / TYPE expected");
   bool ok = true;
   const auto version = Number(Column(line, 0, 9), ok);
   if (!version || !ok) Fail("unreadable RINEX version");
-  header_.version = *version;
-  if (header_.version < 2.0 || header_.version >= 4.0) Fail("unsupported RINEX version");
+  if (*version < 2.0 || *version >= 4.0) Fail("unsupported RINEX version");
+  return *version;
+}
+
+ObsReader::ObsReader(const std::string& path) : RinexFile(path) {
+  ReadHeader();
+}
+
+void ObsReader::ReadHeader() {
+  std::string line;
+  header_.version = ReadVersionLine(line);
   if (Column(line, 20, 1) != "O") Fail("not an observation file");
   const std::string sys = Column(line, 40, 1);
   header_.system = sys.empty() || sys == " " ? 'G' : sys[0];
@@ -428,32 +435,13 @@ bool ObsReader::NextV3(ObsEpoch& epoch) {
 // ---------------------------------------------------------------------------------------------
 // Navigation files
 
-NavReader::NavReader(const std::string& path) : path_(path), in_(path) {
-  if (!in_) throw RinexError(path, 0, "cannot open the file");
+NavReader::NavReader(const std::string& path) : RinexFile(path) {
   ReadHeader();
-}
-
-bool NavReader::GetLine(std::string& line) {
-  if (!std::getline(in_, line)) return false;
-  ++line_no_;
-  if (!line.empty() && line.back() == '\r') line.pop_back();
-  return true;
-}
-
-void NavReader::Fail(const std::string& what) const {
-  throw RinexError(path_, line_no_, what);
 }
 
 void NavReader::ReadHeader() {
   std::string line;
-  if (!GetLine(line)) Fail("empty file");
-  if (Label(line) != "RINEX VERSION / TYPE")
-    Fail("not a RINEX file: RINEX VERSION / TYPE expected");
-  bool ok = true;
-  const auto version = Number(Column(line, 0, 9), ok);
-  if (!version || !ok) Fail("unreadable RINEX version");
-  header_.version = *version;
-  if (header_.version < 2.0 || header_.version >= 4.0) Fail("unsupported RINEX version");
+  header_.version = ReadVersionLine(line);
   const std::string type = Column(line, 20, 1);
   if (header_.version < 3.0) {
     // Version 2 names the system by the file type: N GPS, G GLONASS, H SBAS (geostationary).
@@ -475,6 +463,7 @@ void NavReader::ReadHeader() {
     const std::string label = Label(line);
     if (label == "END OF HEADER") break;
     if (label == "LEAP SECONDS") {
+      bool ok = true;
       const auto v = Number(Column(line, 0, 6), ok);
       if (!ok || !v) Fail("unreadable LEAP SECONDS");
       header_.leap_seconds = static_cast<int>(*v);

@@ -81,7 +81,24 @@ struct ObsEpoch {
   int line = 0;  // line of the epoch's first line
 };
 
-class ObsReader {
+// What both readers share: the file, its line counter for messages, and the first header
+// line with the format version.
+class RinexFile {
+ protected:
+  // Opens the file; throws RinexError when it cannot.
+  explicit RinexFile(const std::string& path);
+  bool GetLine(std::string& line);
+  [[noreturn]] void Fail(const std::string& what) const;
+  // Reads the first line, "RINEX VERSION / TYPE", and returns the version (2.x or 3.x) and the
+  // line itself for its type fields; throws RinexError.
+  double ReadVersionLine(std::string& line);
+
+  std::string path_;
+  std::ifstream in_;
+  int line_no_ = 0;
+};
+
+class ObsReader : private RinexFile {
  public:
   // Opens the file and reads its header; throws RinexError.
   explicit ObsReader(const std::string& path);
@@ -96,8 +113,6 @@ class ObsReader {
   bool Next(ObsEpoch& epoch);
 
  private:
-  bool GetLine(std::string& line);
-  [[noreturn]] void Fail(const std::string& what) const;
   void ReadHeader();
   void HeaderLine(const std::string& line, int& pending_types, char& types_system);
   void ReadSatValues(SatObservations& sat, const std::string& first_part, bool v3);
@@ -105,9 +120,6 @@ class ObsReader {
   bool NextV3(ObsEpoch& epoch);
   void SkipLines(int count);
 
-  std::string path_;
-  std::ifstream in_;
-  int line_no_ = 0;
   ObsHeader header_;
   std::map<char, std::vector<std::string>> translated_;
 };
@@ -134,7 +146,7 @@ struct NavRecord {
   int line = 0;
 };
 
-class NavReader {
+class NavReader : private RinexFile {
  public:
   explicit NavReader(const std::string& path);
 
@@ -144,14 +156,9 @@ class NavReader {
   bool Next(NavRecord& record);
 
  private:
-  bool GetLine(std::string& line);
-  [[noreturn]] void Fail(const std::string& what) const;
   void ReadHeader();
   int OrbitLines(char system) const;
 
-  std::string path_;
-  std::ifstream in_;
-  int line_no_ = 0;
   NavHeader header_;
 };
 
