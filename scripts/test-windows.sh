@@ -10,6 +10,8 @@
 set -euo pipefail
 root=$(cd "$(dirname "$0")/.." && pwd)
 build=${1:-$root/build-win}
+mkdir -p "$build"
+build=$(cd "$build" && pwd)  # Wine wants an absolute prefix path
 jobs=${JOBS:-$(nproc)}
 stage_start=$(date +%s)
 step_start=$stage_start
