@@ -92,7 +92,7 @@ bool TBufFile::OpenWrite(const std::string& path, uint32_t mode) {
   handle_ = platform::OpenFile(path, platform::FileAccess::kWrite, creation,
                                (mode & kFileTemporary) != 0);
   if (handle_ != nullptr) {
-    buffer_size_ = BufferSizeForPath(path);
+    buffer_size_ = write_buffer_size_ != 0 ? write_buffer_size_ : BufferSizeForPath(path);
     storage_.reset(new (std::nothrow) uint8_t[buffer_size_]);
     buffer_ = storage_.get();
     if (buffer_ != nullptr) {
@@ -264,6 +264,10 @@ uint32_t TBufFile::Write(const void* source, uint32_t count) {
   if (mode_ & kFileAppend) target_ = static_cast<int32_t>(file_size_);
   if (target_ != static_cast<int32_t>(position_) && !MoveTo(target_)) return 0;
   const auto* in = static_cast<const uint8_t*>(source);
+  // What does not fit the buffer's free room and would fill at least a whole buffer goes to
+  // the OS in one call after the waiting bytes: copying it through the buffer only splits
+  // it into buffer-sized calls.
+  if (count > buffer_size_ - buffered_ && count >= buffer_size_) return WriteThrough(in, count);
   uint32_t accepted = 0;
   while (accepted < count) {
     const uint32_t n = std::min(count - accepted, buffer_size_ - buffered_);
@@ -274,6 +278,20 @@ uint32_t TBufFile::Write(const void* source, uint32_t count) {
     accepted += n;
     if (buffered_ == buffer_size_ && !WriteOut(buffered_)) break;
   }
+  file_size_ = std::max(file_size_, position_);
+  target_ = static_cast<int32_t>(position_);
+  last_count_ = accepted;
+  return accepted;
+}
+
+uint32_t TBufFile::WriteThrough(const uint8_t* source, uint32_t count) {
+  uint32_t accepted = 0;
+  if (WriteOut(buffered_)) {
+    const int64_t put = handle_->Write(source, count);
+    accepted = put > 0 ? static_cast<uint32_t>(put) : 0;
+    if (accepted != count) status_ |= kFileIoFailed;
+  }
+  position_ += accepted;
   file_size_ = std::max(file_size_, position_);
   target_ = static_cast<int32_t>(position_);
   last_count_ = accepted;

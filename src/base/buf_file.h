@@ -90,6 +90,10 @@ class TBufFile {
   // Reading through the buffer must give the same bytes as reading a mapped view; tests
   // switch mapping off to compare the two. Takes effect at the next OpenRead.
   void set_mapping_allowed(bool allowed) { mapping_allowed_ = allowed; }
+  // The buffer size of the next OpenWrite instead of the buffer-size rule (0: the rule).
+  // For private temporaries that are written once and read back whole, where a few write
+  // calls per megabyte cost less than one per cluster.
+  void set_write_buffer_size(uint32_t bytes) { write_buffer_size_ = bytes; }
 
  private:
   void Reset();
@@ -97,6 +101,7 @@ class TBufFile {
   bool Refill();                  // reading: the next buffer block
   bool MoveTo(int32_t target);    // writing: flush and set the OS file offset
   bool WriteOut(uint32_t count);  // writing: one write call of the waiting bytes
+  uint32_t WriteThrough(const uint8_t* source, uint32_t count);  // writing: past the buffer
 
   std::unique_ptr<platform::File> handle_;
   std::unique_ptr<uint8_t[]> storage_;  // the I/O buffer (null when mapped)
@@ -114,6 +119,7 @@ class TBufFile {
   uint8_t status_ = 0;
   bool writing_ = false;
   bool mapping_allowed_ = true;
+  uint32_t write_buffer_size_ = 0;
 };
 
 // The whole file as one byte string; empty if it cannot be read. The OS error of a failed

@@ -221,6 +221,45 @@ TEST_F(BufFileTest, WriteModes) {
   EXPECT_EQ(ReadWholeFile(path), expected);
 }
 
+// Writes of a buffer or more skip the buffer; the bytes waiting before them must still come
+// first, and seeks back over data written either way must rewrite the right bytes.
+TEST_F(BufFileTest, LargeWritesBetweenSmallOnesKeepTheirPlace) {
+  const std::string bytes = RandomBytes(8 * 65536 + 1000);
+  const std::string path = Path("mixed.bin");
+  for (const uint32_t buffer : {0u, 4096u, 65536u}) {
+    SCOPED_TRACE("buffer " + std::to_string(buffer));
+    TBufFile file;
+    file.set_write_buffer_size(buffer);
+    ASSERT_TRUE(file.OpenWrite(path));
+    if (buffer != 0) {
+      EXPECT_EQ(file.buffer_size(), buffer);
+    }
+    const uint32_t size = file.buffer_size();
+    // Small, exactly one buffer, small, just over a buffer, one byte, a large piece while
+    // the buffer is nearly full, then the rest.
+    const uint32_t pieces[] = {10, size, 3, size + 1, 1, size - 20, 10, 3 * size + 5};
+    uint32_t at = 0;
+    for (const uint32_t n : pieces) {
+      ASSERT_EQ(file.Write(bytes.data() + at, n), n);
+      at += n;
+      EXPECT_EQ(file.tell(), static_cast<int32_t>(at));
+    }
+    file.Write(bytes.data() + at, static_cast<uint32_t>(bytes.size()) - at);
+    EXPECT_EQ(file.file_size(), bytes.size());
+    std::string expected = bytes;
+    // Back into the middle of a large write, a rewrite longer than the buffer, then small.
+    file.Seek(static_cast<int32_t>(size + 7));
+    const std::string patch = RandomBytes(size + 100).substr(50);
+    file.Write(patch.data(), static_cast<uint32_t>(patch.size()));
+    expected.replace(size + 7, patch.size(), patch);
+    file.Seek(5);
+    file.WriteText("xyz");
+    expected.replace(5, 3, "xyz");
+    EXPECT_TRUE(file.Close());
+    EXPECT_TRUE(ReadWholeFile(path) == expected);
+  }
+}
+
 // A file size limit makes the OS accept only part of a write, as a full disk would.
 TEST_F(BufFileTest, ShortWriteSetsTheErrorStatus) {
   const std::string path = Path("limited.bin");
@@ -238,6 +277,13 @@ TEST_F(BufFileTest, ShortWriteSetsTheErrorStatus) {
     if ((file.status() & kFileIoFailed) == 0) _exit(12);
     if (file.Write("more", 4) != 0) _exit(13);  // nothing happens after a failure
     if (file.Close()) _exit(14);                // and closing reports it
+    // A write larger than the buffer, which goes to the OS in one call, fails the same way
+    // and counts only the bytes the OS took.
+    if (!file.OpenWrite(path)) _exit(15);
+    if (file.Write(bytes.data(), static_cast<uint32_t>(bytes.size())) != 10000) _exit(16);
+    if ((file.status() & kFileIoFailed) == 0) _exit(17);
+    if (file.Write(bytes.data(), static_cast<uint32_t>(bytes.size())) != 0) _exit(18);
+    if (file.Close()) _exit(19);
     _exit(0);
   }
   int status = 0;
