@@ -1,5 +1,6 @@
 #include "results/result_file.h"
 
+#include <algorithm>
 #include <cstring>
 #include <filesystem>
 #include <system_error>
@@ -15,6 +16,12 @@ namespace {
 
 constexpr size_t kFrameBytes = 5;  // kind, leading length, trailing length
 constexpr uint32_t kModeWrite = 2;
+constexpr uint32_t kModeWriteKeep = kModeWrite | kFileAtEnd;  // no emptying; starts at the end
+// A thread writer's buffer: a few write calls per megabyte, and with 64 threads still only
+// 16 MB of buffers.
+constexpr uint32_t kThreadFileBuffer = 256 * 1024;
+// The largest run of records handed to one write call by the merge.
+constexpr size_t kLargestRun = size_t{1} << 30;
 
 // The on-disk payload of a plot line description handed over in memory form; empty when
 // `count` is too short to hold the description's fixed part.
@@ -77,6 +84,17 @@ uint32_t MessageType(uint32_t flags) {
 
 bool TResultFile::Open() {
   if (!file_.OpenWrite(path_, kModeWrite)) return false;
+  return WriteHeader();
+}
+
+bool TResultFile::OpenThreadFile() {
+  file_.set_write_buffer_size(kThreadFileBuffer);
+  if (!file_.OpenWrite(path_, kModeWriteKeep)) return false;
+  if (file_.file_size() != 0 && !file_.OpenWrite(path_, kModeWrite)) return false;
+  return WriteHeader();
+}
+
+bool TResultFile::WriteHeader() {
   RecordBuilder header;
   header.Bytes("$YRB", 4).U32(kResultFormatNumber).U16(0);
   WriteRecord(kKindHeader, header.data(), header.size());
@@ -119,13 +137,16 @@ bool TResultFile::WriteRecord(uint8_t kind, const void* bytes, size_t count) {
 }
 
 bool TResultFile::WriteFramed(uint8_t kind, const uint8_t* payload, size_t count) {
+  // Head, payload and tail go to the file's buffer one after the other, without a copy of
+  // the record in between; after a failed write the later ones do nothing.
   const uint16_t length = static_cast<uint16_t>(count + kFrameBytes);
-  std::vector<uint8_t> frame(length);
-  frame[0] = kind;
-  le::Store<uint16_t>(&frame[1], length);
-  if (count != 0) std::memcpy(&frame[3], payload, count);
-  le::Store<uint16_t>(&frame[length - 2], length);
-  file_.Write(frame.data(), static_cast<uint32_t>(frame.size()));
+  uint8_t head[3] = {kind};
+  le::Store<uint16_t>(&head[1], length);
+  uint8_t tail[2];
+  le::Store<uint16_t>(tail, length);
+  file_.Write(head, sizeof head);
+  file_.Write(payload, static_cast<uint32_t>(count));
+  file_.Write(tail, sizeof tail);
   return good();
 }
 
@@ -152,20 +173,33 @@ size_t TResultFile::Append(const std::string& thread_file_path) {
   const size_t size = view->size();
   size_t copied = 0;
   size_t at = 0;
+  size_t run = 0;  // start of the records checked but not yet written
+  // Writes the checked records before `at` in as few calls as the write size allows.
+  const auto write_run = [&] {
+    while (run < at) {
+      const size_t n = std::min(at - run, kLargestRun);
+      file_.Write(data + run, static_cast<uint32_t>(n));
+      run += n;
+    }
+  };
   // Every length is checked against the bytes that remain: a thread file cut short by a
-  // crash or a full disk must end the copy, not carry the reader past the mapping.
+  // crash or a full disk must end the copy, not carry the reader past the mapping. Only
+  // records checked whole are written, so the copy is the same as one record at a time.
   while (size - at >= kFrameBytes) {
     const uint8_t kind = data[at];
     const uint16_t length = le::Load<uint16_t>(data + at + 1);
     if (length < kFrameBytes || length > size - at) break;
     if (le::Load<uint16_t>(data + at + length - 2) != length) break;
     if (kind == kKindEnd) break;
-    if (kind != kKindHeader) {
-      file_.Write(data + at, length);
+    if (kind == kKindHeader) {
+      write_run();
+      run = at + length;  // the header is left out
+    } else {
       ++copied;
     }
     at += length;
   }
+  write_run();
   return copied;
 }
 

@@ -67,6 +67,12 @@ class TResultFile {
   // Creates (replacing) the file and writes the header record. False when the file cannot
   // be created.
   bool Open();
+  // Open for an engine thread's file, which CreateUniqueTempFile made new and empty. The
+  // file is kept as it is rather than emptied again (some file systems, ext4 among them,
+  // write a file that was emptied out to disk when it is closed, and a thread file is
+  // deleted right after the merge), and it is written through a large buffer, as it is
+  // private and read back whole. A file that is not empty is replaced as by Open.
+  bool OpenThreadFile();
   // Writes the end record, then flushes and closes the file. True when the end record and
   // everything before it reached the file.
   bool Close();
@@ -98,6 +104,7 @@ class TResultFile {
 
  private:
   bool WriteFramed(uint8_t kind, const uint8_t* payload, size_t count);
+  bool WriteHeader();
 
   std::string path_;
   TBufFile file_;

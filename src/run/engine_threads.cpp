@@ -56,7 +56,7 @@ uint32_t InitNewThread(TTask& task, vox_ThreadContext* context) {
   writer->set_path(platform::CreateUniqueTempFile(platform::TempFolder(), "VOX"));
   // A file that cannot be created leaves the writer closed: its records are lost, and the
   // merge at release finds nothing; the thread itself carries on.
-  if (!writer->path().empty()) writer->Open();
+  if (!writer->path().empty()) writer->OpenThreadFile();
 
   context->writer = writer.get();
   context->flags |= kOwnThreadFlag;

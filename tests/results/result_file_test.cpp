@@ -3,11 +3,13 @@
 #include <cstring>
 #include <filesystem>
 #include <string>
+#include <vector>
 
 #include <gtest/gtest.h>
 
 #include "result_test_util.h"
 #include "results/plot_description.h"
+#include "results/record_builder.h"
 
 namespace vox {
 namespace {
@@ -195,6 +197,90 @@ TEST_F(ResultFileAppend, StopsAtACutOrCorruptRecord) {
   EXPECT_EQ(writer.Append(TempPath("missing.tmp")), 0u);
   ASSERT_TRUE(writer.Close());
   EXPECT_EQ(SplitRecords(ReadBytes(path)).size(), 5u);
+}
+
+// A record framed by hand: kind, length, payload, length.
+std::vector<uint8_t> Frame(uint8_t kind, const std::vector<uint8_t>& payload) {
+  const auto length = static_cast<uint16_t>(payload.size() + 5);
+  std::vector<uint8_t> out{kind, static_cast<uint8_t>(length), static_cast<uint8_t>(length >> 8)};
+  out.insert(out.end(), payload.begin(), payload.end());
+  out.push_back(static_cast<uint8_t>(length));
+  out.push_back(static_cast<uint8_t>(length >> 8));
+  return out;
+}
+
+void Add(std::vector<uint8_t>& to, const std::vector<uint8_t>& bytes) {
+  to.insert(to.end(), bytes.begin(), bytes.end());
+}
+
+// The merge copies runs of records in single writes, and thread files are written through a
+// large buffer; the bytes must be those of copying record by record, for merges of many
+// buffers' worth, a header met inside a run, and a thread file cut inside a run.
+TEST_F(ResultFileAppend, LargeMergesGiveTheRecordByRecordBytes) {
+  const std::vector<uint8_t> header =
+      Frame(kKindHeader, {'$', 'Y', 'R', 'B', 0x52, 0x10, 0, 0, 0, 0});
+  const std::string thread_path = TempPath("big.tmp");
+  // A thread file left over from earlier, longer than what follows: replaced, not overlaid.
+  test::WriteBytes(thread_path, std::vector<uint8_t>(5000, 0xEE));
+  TResultFile thread(thread_path);
+  ASSERT_TRUE(thread.OpenThreadFile());
+  std::vector<uint8_t> records;  // what the merge must copy
+  std::vector<size_t> ends;      // where each record ends in `records`
+  const size_t sizes[] = {0, 1, 100, kMaxRecordPayload, 4000, 2, 16000, 57};
+  for (size_t i = 0; records.size() < 3'000'000; ++i) {
+    std::vector<uint8_t> payload(sizes[i % std::size(sizes)]);
+    for (size_t j = 0; j < payload.size(); ++j)
+      payload[j] = static_cast<uint8_t>(i * 7 + j);
+    ASSERT_TRUE(thread.WriteRecord(kKindVector, payload.data(), payload.size()));
+    Add(records, Frame(kKindVector, payload));
+    ends.push_back(records.size());
+  }
+  ASSERT_TRUE(thread.Close());
+  std::vector<uint8_t> thread_bytes = header;
+  Add(thread_bytes, records);
+  Add(thread_bytes, Frame(kKindEnd, {}));
+  ASSERT_EQ(ReadBytes(thread_path), thread_bytes);
+
+  // A second thread file with a header in the middle of its records: left out like the first.
+  const std::string odd_path = TempPath("odd.tmp");
+  const std::vector<uint8_t> first = Frame(kKindMessage, std::vector<uint8_t>(300, 1));
+  const std::vector<uint8_t> second = Frame(kKindFan, std::vector<uint8_t>(9000, 2));
+  std::vector<uint8_t> odd = header;
+  Add(odd, first);
+  Add(odd, header);
+  Add(odd, second);
+  Add(odd, Frame(kKindEnd, {}));
+  Add(odd, first);  // after the end record: not copied
+  test::WriteBytes(odd_path, odd);
+
+  const std::string path = TempPath("merged.res");
+  TResultFile writer(path);
+  ASSERT_TRUE(writer.Open());
+  ASSERT_TRUE(writer.WriteMessage("job", 1));
+  EXPECT_EQ(writer.Append(thread_path), ends.size());
+  EXPECT_EQ(writer.Append(odd_path), 2u);
+  // Cut inside the run, in the largest record that follows the cut_after'th: in its head,
+  // in its middle, just before its last byte.
+  const size_t cut_after = ends.size() / 2 / std::size(sizes) * std::size(sizes) + 2;
+  for (const size_t into : {size_t{1}, size_t{3000}, sizes[3] + 4}) {
+    auto cut = std::vector<uint8_t>(thread_bytes.begin(),
+                                    thread_bytes.begin() + header.size() + ends[cut_after] + into);
+    test::WriteBytes(thread_path, cut);
+    EXPECT_EQ(writer.Append(thread_path), cut_after + 1);
+  }
+  ASSERT_TRUE(writer.Close());
+
+  std::vector<uint8_t> expected = header;
+  RecordBuilder message;
+  message.U32(3).U32(0).CountedString("job");
+  Add(expected, Frame(kKindMessage, {message.data(), message.data() + message.size()}));
+  Add(expected, records);
+  Add(expected, first);
+  Add(expected, second);
+  for (int i = 0; i < 3; ++i)
+    expected.insert(expected.end(), records.begin(), records.begin() + ends[cut_after]);
+  Add(expected, Frame(kKindEnd, {}));
+  EXPECT_EQ(ReadBytes(path), expected);
 }
 
 }  // namespace
