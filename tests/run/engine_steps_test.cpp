@@ -156,6 +156,31 @@ TEST_F(EngineStepsTest, FourWorkersTakeTenOccupationsAtMostFourAtATime) {
   EXPECT_TRUE(temp_.TempFiles("VOX").empty());  // every thread file merged and deleted
 }
 
+// The largest pool: 32 workers writing and merging their thread files at once (this is the
+// case the thread sanitizer build exercises hardest).
+TEST_F(EngineStepsTest, ThirtyTwoWorkersTakeSixtyFourOccupationsAndMergeEveryBlockWhole) {
+  setenv("SCHED_SLOW_MS", "5", 1);
+  ASSERT_TRUE(Prepare(Job(64, "NumCPUs=32\n")));
+  EXPECT_TRUE(RunRawFilterStep(task_));
+  const std::vector<std::string> records = Finish();
+
+  int most = 0;
+  for (const std::string& l : CallsOf("occ "))
+    most = std::max(most, std::atoi(l.substr(l.find("running=") + 8).c_str()));
+  EXPECT_EQ(CallsOf("occ ").size(), 64u);
+  EXPECT_LE(most, 32);
+  EXPECT_GE(most, 2);
+  for (int n = 1; n <= 64; ++n) {
+    const std::vector<std::string> block = OccupationBlock(n);
+    EXPECT_NE(std::search(records.begin(), records.end(), block.begin(), block.end()),
+              records.end())
+        << "occupation " << n;
+  }
+  EXPECT_EQ(records.size(), 1 + 64 * 3 + 2u);
+  EXPECT_TRUE(task_.thread_writers.empty());
+  EXPECT_TRUE(temp_.TempFiles("VOX").empty());
+}
+
 TEST_F(EngineStepsTest, ABreakBeforeTheFirstOccupationProcessesNone) {
   for (const char* cpus : {"NumCPUs=1\n", "NumCPUs=4\n"}) {
     SCOPED_TRACE(cpus);
