@@ -47,7 +47,7 @@ std::string ChooseLogPath() {
 }
 
 FILE* OpenLogFile(const std::string& path) {
-  return std::fopen(path.c_str(), "w");
+  return platform::OpenTextFileForWriting(path);
 }
 
 // Installs file as the log; the previous one is closed once no writer uses it.

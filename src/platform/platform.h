@@ -8,6 +8,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <cstdio>
 #include <functional>
 #include <memory>
 #include <string>
@@ -142,6 +143,12 @@ class MappedFile {
 // Maps the whole open file read-only; null when mapping is not possible (also for an empty
 // file).
 std::unique_ptr<MappedFile> MapWholeFile(File& file);
+
+// Opens (creating or emptying) a text file for writing through the C runtime, for the
+// engine log: text mode where the C runtime translates line ends (CR LF on Windows). The
+// path is UTF-8 like every path here, so on Windows it goes through the wide-character open
+// (the narrow one would read it in the ANSI code page). Null on failure.
+std::FILE* OpenTextFileForWriting(const std::string& path);
 
 bool FileExists(const std::string& path);       // anything at the path
 bool DirectoryExists(const std::string& path);  // a folder at the path

@@ -225,4 +225,8 @@ const char* NullDevicePath() {
   return "/dev/null";
 }
 
+std::FILE* OpenTextFileForWriting(const std::string& path) {
+  return std::fopen(path.c_str(), "w");  // no line-end translation on POSIX
+}
+
 }  // namespace vox::platform

@@ -1,6 +1,8 @@
 // Win32 implementation of platform.h: files, file mapping, volumes and temporary files.
 #include <windows.h>
 
+#include <cstdio>
+
 #include "platform/platform.h"
 #include "platform/win32/win32_text.h"
 
@@ -195,6 +197,10 @@ std::string CreateUniqueTempFile(const std::string& folder, const std::string& p
 
 const char* NullDevicePath() {
   return "nul";
+}
+
+std::FILE* OpenTextFileForWriting(const std::string& path) {
+  return _wfopen(win32::WideFromUtf8(path).c_str(), L"wt");
 }
 
 }  // namespace vox::platform
