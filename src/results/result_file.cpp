@@ -17,9 +17,11 @@ namespace {
 constexpr size_t kFrameBytes = 5;  // kind, leading length, trailing length
 constexpr uint32_t kModeWrite = 2;
 constexpr uint32_t kModeWriteKeep = kModeWrite | kFileAtEnd;  // no emptying; starts at the end
-// A thread writer's buffer: a few write calls per megabyte, and with 64 threads still only
-// 16 MB of buffers.
-constexpr uint32_t kThreadFileBuffer = 256 * 1024;
+// A thread writer's buffer: the largest of the buffer-size rule. Larger buffers save few write
+// calls but come from fresh memory pages for every thread, which costs more than the calls.
+constexpr uint32_t kThreadFileBuffer = kLargestBufferSize;
+// Records up to this size are framed on the stack and handed over in one write.
+constexpr size_t kSmallRecord = 512;
 // The largest run of records handed to one write call by the merge.
 constexpr size_t kLargestRun = size_t{1} << 30;
 
@@ -137,9 +139,19 @@ bool TResultFile::WriteRecord(uint8_t kind, const void* bytes, size_t count) {
 }
 
 bool TResultFile::WriteFramed(uint8_t kind, const uint8_t* payload, size_t count) {
-  // Head, payload and tail go to the file's buffer one after the other, without a copy of
-  // the record in between; after a failed write the later ones do nothing.
   const uint16_t length = static_cast<uint16_t>(count + kFrameBytes);
+  if (length <= kSmallRecord) {
+    // Most records are small and many: one write call each.
+    uint8_t frame[kSmallRecord];
+    frame[0] = kind;
+    le::Store<uint16_t>(&frame[1], length);
+    if (count != 0) std::memcpy(&frame[3], payload, count);
+    le::Store<uint16_t>(&frame[length - 2], length);
+    file_.Write(frame, length);
+    return good();
+  }
+  // Head, payload and tail go to the file one after the other, without a copy of the record
+  // in between; after a failed write the later ones do nothing.
   uint8_t head[3] = {kind};
   le::Store<uint16_t>(&head[1], length);
   uint8_t tail[2];

@@ -70,8 +70,9 @@ class TResultFile {
   // Open for an engine thread's file, which CreateUniqueTempFile made new and empty. The
   // file is kept as it is rather than emptied again (some file systems, ext4 among them,
   // write a file that was emptied out to disk when it is closed, and a thread file is
-  // deleted right after the merge), and it is written through a large buffer, as it is
-  // private and read back whole. A file that is not empty is replaced as by Open.
+  // deleted right after the merge), and it is written through the largest buffer the
+  // buffer-size rule knows, whatever its volume, as it is private and read back whole. A
+  // file that is not empty is replaced as by Open.
   bool OpenThreadFile();
   // Writes the end record, then flushes and closes the file. True when the end record and
   // everything before it reached the file.
