@@ -58,6 +58,16 @@ class TBufFile {
   uint32_t Read(void* destination, uint32_t count);
   // The next byte, or -1 at the end of the data or on failure.
   int ReadByte();
+  // The count bytes at offset inside the mapped view, for reading them in place; null when the
+  // file is not mapped, a status bit is set, or the range does not lie whole inside the file.
+  // Callers then fall back to Seek and Read, which behave exactly as before. The pointer
+  // stays valid until the file is closed; the read position does not move.
+  const uint8_t* MappedBytes(uint32_t offset, uint32_t count) const {
+    if (!mapped_ || status_ != 0 || offset > static_cast<uint32_t>(INT32_MAX) ||
+        count > file_size_ || offset > file_size_ - count)
+      return nullptr;
+    return buffer_ + offset;
+  }
   // Reads up to capacity - 1 bytes, stopping after the first terminator, which is consumed
   // but not stored; destination is always zero-terminated (capacity > 0). Returns the number
   // of bytes consumed from the file, so 0 means there was nothing left to read.
