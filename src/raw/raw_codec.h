@@ -7,11 +7,54 @@
 // the scan uses them directly inside its per-order walk.
 #pragma once
 
+#include <array>
+
 #include "raw/field_cursor.h"
 #include "raw/raw_records.h"
 #include "raw/signal_rules.h"
 
 namespace vox {
+
+// Where a signal block's code and phase values lie and how long the block is, from its flags
+// alone. This mirrors Signal8 and Signal51 below (a test holds them together), so that a walk
+// needing only a few values can step over the rest without decoding them.
+struct SignalLayout {
+  uint8_t size;
+  uint8_t code_at;
+  uint8_t phase_at;
+};
+
+namespace detail {
+// Layout index: bits 0-3 the code, phase and two 32-bit value flags; bits 4-5 the two leading
+// extras (16-bit words for tag 51, bytes for tag 8).
+constexpr std::array<SignalLayout, 64> MakeSignalLayouts(bool tag51) {
+  std::array<SignalLayout, 64> table{};
+  for (unsigned i = 0; i < 64; ++i) {
+    const unsigned extras = ((i >> 4) & 1u) + ((i >> 5) & 1u);
+    const unsigned code_at = 2 + extras * (tag51 ? 2 : 1);
+    const unsigned phase_at = code_at + ((i & 1u) ? 8 : 0);
+    const unsigned size = phase_at + ((i & 2u) ? 8 : 0) + ((i & 4u) ? 4 : 0) + ((i & 8u) ? 4 : 0);
+    table[i] = {static_cast<uint8_t>(size), static_cast<uint8_t>(code_at),
+                static_cast<uint8_t>(phase_at)};
+  }
+  return table;
+}
+inline constexpr std::array<SignalLayout, 64> kSignalLayouts8 = MakeSignalLayouts(false);
+inline constexpr std::array<SignalLayout, 64> kSignalLayouts51 = MakeSignalLayouts(true);
+}  // namespace detail
+
+template <bool kTag51>
+constexpr const SignalLayout& SignalLayoutOf(uint16_t flags) {
+  static_assert(kSigCode == 1u << 8 && kSigPhase == 1u << 9 && kSigF32A == 1u << 10 &&
+                kSigCorrection == 1u << 11);
+  if constexpr (kTag51) {
+    static_assert(kSig51U16 == 1u << 14 && kSig51I16 == 1u << 15);
+    return detail::kSignalLayouts51[((flags >> 8) & 0x0Fu) | ((flags >> 10) & 0x30u)];
+  } else {
+    static_assert(kSig8ByteA == 1u << 5 && kSig8ByteB == 1u << 6);
+    return detail::kSignalLayouts8[((flags >> 8) & 0x0Fu) | ((flags >> 1) & 0x30u)];
+  }
+}
 
 template <typename Order>
 struct RawCodec {

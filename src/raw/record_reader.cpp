@@ -7,9 +7,16 @@ namespace vox {
 RecordReader::RecordReader(TBufFile& file)
     : file_(file),
       buffer_(std::make_unique<std::array<uint8_t, kRecordBufferSize>>()),
+      data_(buffer_->data()),
       decoder_(&DecoderFor(ByteOrder::kLittle)) {}
 
 bool RecordReader::Fill(uint32_t count) {
+  if (const uint8_t* in_place = file_.MappedBytes(offset_, count)) {
+    data_ = in_place;
+    offset_ += count;
+    return true;
+  }
+  data_ = buffer_->data();
   file_.Seek(static_cast<int32_t>(offset_));
   const uint32_t got = file_.Read(buffer_->data(), count);
   offset_ += got;
@@ -19,7 +26,7 @@ bool RecordReader::Fill(uint32_t count) {
 // The last five bytes of a read: check field of the current record, tag and length of the
 // next one.
 void RecordReader::TakeTrailer(uint32_t count) {
-  const uint8_t* t = buffer_->data() + count - kRecordFrame;
+  const uint8_t* t = data_ + count - kRecordFrame;
   FieldCursor<LittleEndianOrder> le(ByteSpan(t, kRecordFrame));
   FieldCursor<BigEndianOrder> be(ByteSpan(t, kRecordFrame));
   if (decoder_->order == ByteOrder::kBig) {
@@ -45,7 +52,7 @@ RawStart RecordReader::Start() {
   RawStart s;
   offset_ = 0;
   if (!Fill(kHeaderReadSize)) return Fail(s, 2, " - Unexpected EOF\n");
-  const uint8_t* b = buffer_->data();
+  const uint8_t* b = data_;
   if (b[0] != kTagHeader) return Fail(s, 3, " - File Header expected\n");
   const auto order = OrderFromSignature(b + 3);
   if (!order) return Fail(s, 3, " - Unexpected signature\n");

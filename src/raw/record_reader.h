@@ -5,6 +5,10 @@
 // position (for seeking back to it later) is the offset of the check field in front of its
 // tag, so that five bytes read there give (check, tag, length) of that record.
 //
+// When the file is mapped whole, records are read in place from the mapped view instead of
+// being copied into the buffer; body() then points into the mapping (valid until the next
+// Next() or Seek(), like the buffer). Either way the same bytes are handed out.
+//
 // Every length is validated before it is used: a record shorter than its frame or longer
 // than the 16384-byte buffer stops the walk, and nothing outside the buffer is ever read or
 // written, whatever the file holds.
@@ -56,7 +60,7 @@ class RecordReader {
   // The record last read by Next().
   uint8_t tag() const { return tag_; }
   uint16_t length() const { return length_; }
-  ByteSpan body() const { return ByteSpan(buffer_->data(), length_ - kRecordFrame); }
+  ByteSpan body() const { return ByteSpan(data_, length_ - kRecordFrame); }
   uint16_t check() const { return check_; }
   uint32_t position() const { return position_; }
 
@@ -74,12 +78,14 @@ class RecordReader {
   }
 
  private:
-  // Reads count bytes at the current offset into the buffer.
+  // Makes the count bytes at the current offset available at data_: in place when the file
+  // is mapped, else copied into the buffer.
   bool Fill(uint32_t count);
   void TakeTrailer(uint32_t count);
 
   TBufFile& file_;
   std::unique_ptr<std::array<uint8_t, kRecordBufferSize>> buffer_;
+  const uint8_t* data_;  // the bytes of the last Fill: the buffer or the mapped view
   const RawDecoder* decoder_;
   uint32_t offset_ = 0;  // file offset after the last byte read
   uint8_t tag_ = 0;

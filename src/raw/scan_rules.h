@@ -11,6 +11,25 @@
 
 namespace vox {
 
+// The window check of a 64-bit float (see InWindow in signal_rules.h) on its bit pattern:
+// zero of either sign passes, else the biased exponent must lie from 1023 + lo up to but not
+// including 1023 + hi (this also rejects subnormals, infinities and NaN). Same answer as
+// InWindow<kLo, kHi> for every pattern, without float compares, so the scan's walk can fold
+// the result into the flags without branches.
+template <int kLo, int kHi>
+constexpr bool InWindowBits(uint64_t bits) {
+  static_assert(kLo > -1023 && kHi < 1024 && kLo < kHi);
+  const uint64_t exponent = (bits >> 52) & 0x7FF;
+  return (bits << 1) == 0 ||
+         exponent - static_cast<uint64_t>(1023 + kLo) < static_cast<uint64_t>(kHi - kLo);
+}
+constexpr bool CodeBitsOk(uint64_t bits) {
+  return InWindowBits<-50, 28>(bits);
+}
+constexpr bool PhaseBitsOk(uint64_t bits) {
+  return InWindowBits<-50, 44>(bits);
+}
+
 // The spacings of consecutive epochs: at most 100 distinct intervals with their counts.
 class IntervalTable {
  public:
