@@ -141,7 +141,11 @@ TEST_F(NmeaOutputTest, FirstFixWritesZdaThenGgaAndLaterFixesOnlyGga) {
     EXPECT_EQ(text.substr(star + 1, 2), hex);
   }
 
-  // The same file through an independent NMEA parser, where one is installed.
+  // The same file through an independent NMEA parser, where one is installed (the Linux
+  // build installs it; the Windows programs run under an emulator without Node.js).
+#ifdef _WIN32
+  GTEST_SKIP() << "the independent NMEA check runs in the Linux build";
+#else
   const std::string node_modules = std::string(VOX_BUILD_DIR) + "/npm/node_modules";
   if (std::system("node --version > /dev/null 2>&1") != 0) {
     GTEST_SKIP() << "node is not installed: independent NMEA check skipped";
@@ -155,6 +159,7 @@ TEST_F(NmeaOutputTest, FirstFixWritesZdaThenGgaAndLaterFixesOnlyGga) {
                  << ": independent NMEA check skipped";
   }
   EXPECT_EQ(status, 0) << command;
+#endif
 }
 
 TEST_F(NmeaOutputTest, AnOutputThatCannotBeCreatedReceivesNothing) {

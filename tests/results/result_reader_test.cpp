@@ -123,7 +123,9 @@ TEST(ResultReader, ReportsWhereAFileIsCutOrCorrupt) {
   EXPECT_EQ(r.records.size(), 1u);
 }
 
-#ifdef VOXDUMP_PATH
+// voxdump's own runs read its exit status through a POSIX pipe (the Windows build checks
+// voxdump.exe in its whole-job script).
+#if defined(VOXDUMP_PATH) && !defined(_WIN32)
 std::string RunCommand(const std::string& command, int& status) {
   std::string out;
   FILE* pipe = popen(command.c_str(), "r");

@@ -7,6 +7,7 @@
 #include <float.h>
 
 #include <atomic>
+#include <cstdio>
 #include <stdexcept>
 #include <string>
 
@@ -144,6 +145,29 @@ TEST(Win32Files, VolumesReportTheirClusterSize) {
   EXPECT_TRUE(QueryVolume("relative.res").known);  // the current directory's drive
   EXPECT_FALSE(QueryVolume("").known);
   EXPECT_FALSE(QueryVolume("Q:\\no-such-drive\\x.res").known);
+}
+
+// The engine log lives in the user's temporary folder, whose name may hold characters
+// outside the ANSI code page; it is written in text mode, so its lines end in CR LF.
+TEST(Win32Files, TextFilesOpenUnderNonAsciiFoldersAndEndTheirLinesInCrLf) {
+  const std::string folder = TempFolder() + "vox \xC3\xA9t\xC3\xA9 \xE6\xB8\xAC\xE9\x87\x8F";
+  const int wide_length = MultiByteToWideChar(CP_UTF8, 0, folder.c_str(), -1, nullptr, 0);
+  std::wstring wide(static_cast<size_t>(wide_length), L'\0');
+  MultiByteToWideChar(CP_UTF8, 0, folder.c_str(), -1, wide.data(), wide_length);
+  ASSERT_TRUE(CreateDirectoryW(wide.c_str(), nullptr) || GetLastError() == ERROR_ALREADY_EXISTS);
+  const std::string path = folder + "\\log.txt";
+  std::FILE* log = OpenTextFileForWriting(path);
+  ASSERT_NE(log, nullptr);
+  std::fputs("first\nsecond\n", log);
+  std::fclose(log);
+  auto file = OpenFile(path, FileAccess::kRead, FileCreation::kOpenExisting);
+  ASSERT_TRUE(file);
+  char bytes[32] = {};
+  EXPECT_EQ(file->Read(bytes, sizeof bytes), 15);
+  EXPECT_STREQ(bytes, "first\r\nsecond\r\n");
+  file.reset();
+  EXPECT_TRUE(RemoveFile(path));
+  RemoveDirectoryW(wide.c_str());
 }
 
 // ---------------------------------------------------------------- texts
