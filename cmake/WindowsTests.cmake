@@ -25,7 +25,6 @@ get_filename_component(VOX_SHARED_DIR "${PROJECT_SOURCE_DIR}/../shared" ABSOLUTE
 
 # Programs that need POSIX-only facilities; they are defined (so that their rooms' CMake
 # files stay as they are) but neither built nor run here.
-#   buf_file_test              resource limits (setrlimit) for failing writes
 #   engine_example_job_test    runs programs and reads their wait status
 #   raw_probe_job_test         forks a child per job
 #   engines_reference_test     exports the library from the test program so that engines bind
@@ -34,7 +33,7 @@ get_filename_component(VOX_SHARED_DIR "${PROJECT_SOURCE_DIR}/../shared" ABSOLUTE
 #   api_probe_engine_test      the same export of the library from the test program
 #   api_export_list_test       reads the ELF symbol table (windows_export_table reads the DLL's)
 #   results_probe_job_test     (listed for completeness; defined by its room directly)
-set(VOX_WINDOWS_EXCLUDED_TESTS engines_reference_test buf_file_test engine_example_job_test
+set(VOX_WINDOWS_EXCLUDED_TESTS engines_reference_test engine_example_job_test
   raw_probe_job_test results_probe_job_test api_probe_engine_test api_export_list_test)
 
 # vox_test(NAME SOURCES...): as on Linux, but one ctest entry per program.

@@ -1,10 +1,12 @@
 #include "base/buf_file.h"
 
 #include <gtest/gtest.h>
+#ifndef _WIN32
 #include <signal.h>
 #include <sys/resource.h>
 #include <sys/wait.h>
 #include <unistd.h>
+#endif
 
 #include <cstring>
 #include <filesystem>
@@ -260,7 +262,9 @@ TEST_F(BufFileTest, LargeWritesBetweenSmallOnesKeepTheirPlace) {
   }
 }
 
-// A file size limit makes the OS accept only part of a write, as a full disk would.
+// A file size limit makes the OS accept only part of a write, as a full disk would (set in a
+// forked child: POSIX only).
+#ifndef _WIN32
 TEST_F(BufFileTest, ShortWriteSetsTheErrorStatus) {
   const std::string path = Path("limited.bin");
   const pid_t child = fork();
@@ -292,6 +296,7 @@ TEST_F(BufFileTest, ShortWriteSetsTheErrorStatus) {
   EXPECT_EQ(WEXITSTATUS(status), 0);
   EXPECT_LE(fs::file_size(path), 10000u);
 }
+#endif  // _WIN32
 
 TEST(BufferSizeRule, VolumesAndPaths) {
   platform::VolumeInfo info;
