@@ -1,13 +1,7 @@
 // The epoch stream over scanned raw files, in both byte orders and both epoch record kinds.
 #include <gtest/gtest.h>
 
-#include <cmath>
-#include <filesystem>
-#include <fstream>
-#include <sstream>
-
 #include "epoch_test_files.h"
-#include "job/leap_seconds.h"
 #include "vox/vox_sdk_epoch.h"
 
 namespace vox::test {
@@ -35,29 +29,20 @@ std::vector<uint64_t> SecondsOf(std::initializer_list<uint32_t> seconds) {
   return t;
 }
 
-TEST_P(EpochStreamTest, FromAndToOutsideTheSpanUseTheWholeSpan) {
+// Outside the file's span from and to take the whole span; inside they limit it.
+TEST_P(EpochStreamTest, FromAndToLimitTheSpanOnlyInsideIt) {
   ScannedFile f(File(Seconds(tag(), 10, 15)));
   ASSERT_EQ(f.status, kScanComplete);
-  const TimeMs before = At(0), after = At(100);
-  auto s = f.Open(0, &before, &after);
-  ASSERT_TRUE(s);
-  EXPECT_EQ(Ms(s->start()), Ms(At(10)));
-  EXPECT_EQ(Ms(s->end()), Ms(At(14)));
-  EXPECT_EQ(Delivered(*s), SecondsOf({10, 11, 12, 13, 14}));
-}
-
-TEST_P(EpochStreamTest, FromAndToInsideTheSpanLimitIt) {
-  ScannedFile f(File(Seconds(tag(), 10, 15)));
-  const TimeMs from = At(11), to = At(13);
-  auto s = f.Open(0, &from, &to);
-  ASSERT_TRUE(s);
-  EXPECT_EQ(Delivered(*s), SecondsOf({11, 12, 13}));
-}
-
-TEST_P(EpochStreamTest, FromAfterToGivesNoStream) {
-  ScannedFile f(File(Seconds(tag(), 10, 15)));
-  const TimeMs from = At(13), to = At(11);
-  EXPECT_FALSE(f.Open(0, &from, &to));
+  const TimeMs before = At(0), from = At(11), to = At(13), after = At(100);
+  auto whole = f.Open(0, &before, &after);
+  ASSERT_TRUE(whole);
+  EXPECT_EQ(Ms(whole->start()), Ms(At(10)));
+  EXPECT_EQ(Ms(whole->end()), Ms(At(14)));
+  EXPECT_EQ(Delivered(*whole), SecondsOf({10, 11, 12, 13, 14}));
+  auto part = f.Open(0, &from, &to);
+  ASSERT_TRUE(part);
+  EXPECT_EQ(Delivered(*part), SecondsOf({11, 12, 13}));
+  EXPECT_FALSE(f.Open(0, &to, &from)) << "from after to gives no stream";
 }
 
 TEST_P(EpochStreamTest, IntervalOfTheFileDeliversEveryEpoch) {
@@ -95,6 +80,9 @@ TEST_P(EpochStreamTest, FindPositionsAndRejectsTimesOutsideTheSpan) {
   auto s = f.Open();
   ASSERT_TRUE(s);
   vox_EpochData e{};
+  vox_EpochSatData d{};
+  EXPECT_FALSE(s->GetNext(e)) << "nothing before the first Find";
+  EXPECT_FALSE(s->GetSatellite(d));
   const TimeMs mid = At(12, 500), early = At(9), late = At(15);
   ASSERT_TRUE(s->Find(&mid, e));
   EXPECT_EQ(e.seconds, At(13).seconds);
@@ -107,16 +95,6 @@ TEST_P(EpochStreamTest, FindPositionsAndRejectsTimesOutsideTheSpan) {
   // Find always starts over, also after the stream ran to its end.
   EXPECT_EQ(Delivered(*s).size(), 5u);
   EXPECT_EQ(Delivered(*s).size(), 5u);
-}
-
-TEST_P(EpochStreamTest, GetNextBeforeFindGivesNothing) {
-  ScannedFile f(File(Seconds(tag(), 10, 15)));
-  auto s = f.Open();
-  ASSERT_TRUE(s);
-  vox_EpochData e{};
-  EXPECT_FALSE(s->GetNext(e));
-  vox_EpochSatData d{};
-  EXPECT_FALSE(s->GetSatellite(d));
 }
 
 TEST_P(EpochStreamTest, NavigationCoordinatesGoWithEveryEpoch) {
@@ -203,33 +181,24 @@ TEST_P(EpochStreamTest, SmoothingSubtractsTheCodeCorrection) {
   }
 }
 
-TEST_P(EpochStreamTest, FindAfterMidnightDatesTheFirstEpochsByTheirOwnReference) {
-  RawWriter w(order());
-  w.Header().TimeRef("GPS", {86398000, kDay});
-  w.Epoch(tag(), 86398000, {Sat(tag(), 'G', 1, {{0, 2.0e7, {}}})});
-  w.Epoch(tag(), 86399000, {Sat(tag(), 'G', 1, {{0, 2.0e7, {}}})});
-  w.TimeRef("GPS", {0, kDay + 1});
-  w.Epoch(tag(), 0, {Sat(tag(), 'G', 1, {{0, 2.0e7, {}}})});
-  w.Epoch(tag(), 1000, {Sat(tag(), 'G', 1, {{0, 2.0e7, {}}})});
-  w.EndOfData();
-  ScannedFile f(w);
-  auto s = f.Open();
-  ASSERT_TRUE(s);
-  const auto expected = SecondsOf({86398, 86399, 86400, 86401});
-  EXPECT_EQ(Delivered(*s), expected);
-  EXPECT_EQ(Delivered(*s), expected) << "a second pass sees the same times";
-}
-
-TEST_P(EpochStreamTest, EpochsPastMidnightWithoutANewReferenceTakeTheNextDay) {
-  RawWriter w(order());
-  w.Header().TimeRef("GPS", {86399000, kDay});
-  for (uint32_t ms : {86399000u, 0u, 1000u})
-    w.Epoch(tag(), ms, {Sat(tag(), 'G', 1, {{0, 2.0e7, {}}})});
-  w.EndOfData();
-  ScannedFile f(w);
-  auto s = f.Open();
-  ASSERT_TRUE(s);
-  EXPECT_EQ(Delivered(*s), SecondsOf({86399, 86400, 86401}));
+// Epochs past midnight take the next day, with a new time reference after midnight (Find
+// still dates the epochs before it by their own reference) and without one.
+TEST_P(EpochStreamTest, EpochsPastMidnightTakeTheNextDay) {
+  for (bool new_reference : {true, false}) {
+    RawWriter w(order());
+    w.Header().TimeRef("GPS", {86398000, kDay});
+    for (uint32_t ms : {86398000u, 86399000u, 0u, 1000u}) {
+      if (ms == 0 && new_reference) w.TimeRef("GPS", {0, kDay + 1});
+      w.Epoch(tag(), ms, {Sat(tag(), 'G', 1, {{0, 2.0e7, {}}})});
+    }
+    w.EndOfData();
+    ScannedFile f(w);
+    auto s = f.Open();
+    ASSERT_TRUE(s);
+    const auto expected = SecondsOf({86398, 86399, 86400, 86401});
+    EXPECT_EQ(Delivered(*s), expected) << "new reference " << new_reference;
+    EXPECT_EQ(Delivered(*s), expected) << "a second pass sees the same times";
+  }
 }
 
 // Each force-copy rule on a GLONASS satellite (its codes carry the 17 leap seconds of a

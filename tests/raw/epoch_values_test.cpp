@@ -4,10 +4,10 @@
 
 #include <filesystem>
 #include <fstream>
-#include <sstream>
 
 #include "epoch_test_files.h"
 #include "job/leap_seconds.h"
+#include "support/scratch.h"
 #include "vox/vox_sdk_epoch.h"
 
 namespace vox::test {
@@ -42,8 +42,7 @@ TEST_P(EpochValuesTest, CodeValuesComeOnOneTimeScale) {
     EXPECT_EQ(s->time_reference().leap_seconds, 17u);
     const auto d = FirstSatellite(*s);
     ASSERT_TRUE(d) << c.system << int(c.tag) << c.time_system;
-    const double expected = c.offset == 14.0 - L ? pr / kC + (14.0 - L) : pr / kC + c.offset;
-    EXPECT_EQ(d->values[0], expected) << c.system << int(c.tag) << c.time_system;
+    EXPECT_EQ(d->values[0], pr / kC + c.offset) << c.system << int(c.tag) << c.time_system;
   }
 }
 
@@ -74,49 +73,38 @@ TEST_P(EpochValuesTest, UncoveredTimeWithoutLeapSecondsCountsZero) {
   EXPECT_EQ(s->time_reference().leap_seconds, 0u);
 }
 
-// GPS 5 with L2C and L2P code and phase; the scan's own decisions are replaced by the test's.
-class L2cRules {
- public:
-  explicit L2cRules(RawOrder order)
-      : f_(BuildFile(order, {{1000, {Sat(51, 'G', 5, {{2, 2.1e7, 1.1e8}, {3, 2.2e7, 1.2e8}})}}})) {}
-  vox_EpochSatData Read(bool usable, bool agreeing) {
-    f_.ClearRules();
-    f_.file.c2_l2_offset = 0.25;
-    if (usable) f_.file.c2_usable_mask = 1u << 4;
-    if (agreeing) f_.file.c2_agreeing_mask = 1u << 4;
-    auto s = f_.Open();
-    return *FirstSatellite(*s, -1.0);
-  }
-
- private:
-  ScannedFile f_;
-};
-
 constexpr int kL2cCode = 4, kL2cPhase = 5, kL2pCode = 6, kL2pPhase = 7;
 
-TEST_P(EpochValuesTest, L2cInBothMasksIsCorrectedByTheOffset) {
-  L2cRules r(GetParam());
-  const auto d = r.Read(true, true);
-  EXPECT_EQ(d.presence, 0xF0u);
-  EXPECT_EQ(d.values[kL2cPhase], 1.1e8 - 0.25);
-  EXPECT_EQ(d.values[kL2cCode], 2.1e7 / kC);
-}
-
-TEST_P(EpochValuesTest, L2cUsableOnlyTakesTheL2pPhase) {
-  L2cRules r(GetParam());
-  const auto d = r.Read(true, false);
-  EXPECT_EQ(d.presence, 0xF0u);
-  EXPECT_EQ(d.values[kL2cPhase], 1.2e8);
-  EXPECT_EQ(d.values[kL2cCode], 2.1e7 / kC) << "the L2C code stays";
-}
-
-TEST_P(EpochValuesTest, L2cInNeitherMaskTakesL2pCodeAndPhase) {
-  L2cRules r(GetParam());
-  const auto d = r.Read(false, false);
-  EXPECT_EQ(d.presence, 0xF0u);
-  EXPECT_EQ(d.values[kL2cCode], 2.2e7 / kC);
-  EXPECT_EQ(d.values[kL2cPhase], 1.2e8);
-  EXPECT_EQ(d.values[kL2pCode], 2.2e7 / kC);
+// GPS 5 with L2C and L2P code and phase under each L2C decision of the scan (the scan's own
+// replaced by the test's): L2P stays as it is, L2C is corrected or taken from L2P.
+TEST_P(EpochValuesTest, L2cDecisionsChooseTheL2cValues) {
+  struct Case {
+    bool usable, agreeing;
+    double l2c_code, l2c_phase;
+  };
+  const Case cases[] = {
+      {true, true, 2.1e7 / kC, 1.1e8 - 0.25},  // both masks: corrected by the offset
+      {true, false, 2.1e7 / kC, 1.2e8},        // usable only: L2P phase, the L2C code stays
+      {false, false, 2.2e7 / kC, 1.2e8},       // neither: L2P code and phase
+  };
+  ScannedFile f(
+      BuildFile(GetParam(), {{1000, {Sat(51, 'G', 5, {{2, 2.1e7, 1.1e8}, {3, 2.2e7, 1.2e8}})}}}));
+  for (const Case& c : cases) {
+    SCOPED_TRACE(std::string("usable ") + (c.usable ? "1" : "0") + " agreeing " +
+                 (c.agreeing ? "1" : "0"));
+    f.ClearRules();
+    f.file.c2_l2_offset = 0.25;
+    if (c.usable) f.file.c2_usable_mask = 1u << 4;
+    if (c.agreeing) f.file.c2_agreeing_mask = 1u << 4;
+    auto s = f.Open();
+    const auto d = FirstSatellite(*s);
+    ASSERT_TRUE(d);
+    EXPECT_EQ(d->presence, 0xF0u);
+    EXPECT_EQ(d->values[kL2cCode], c.l2c_code);
+    EXPECT_EQ(d->values[kL2cPhase], c.l2c_phase);
+    EXPECT_EQ(d->values[kL2pCode], 2.2e7 / kC);
+    EXPECT_EQ(d->values[kL2pPhase], 1.2e8);
+  }
 }
 
 TEST_P(EpochValuesTest, L2cUsableOnlyWithoutL2pLosesItsPhase) {
@@ -127,13 +115,6 @@ TEST_P(EpochValuesTest, L2cUsableOnlyWithoutL2pLosesItsPhase) {
   const auto d = FirstSatellite(*s, -1.0);
   EXPECT_EQ(d->presence, 1u << kL2cCode);
   EXPECT_EQ(d->values[kL2cPhase], -1.0);
-}
-
-std::string ReadText(const std::string& path) {
-  std::ifstream in(path, std::ios::binary);
-  std::stringstream s;
-  s << in.rdbuf();
-  return s.str();
 }
 
 size_t Count(const std::string& text, const std::string& what) {
@@ -165,7 +146,7 @@ TEST_P(EpochValuesTest, FirstSolutionCreatesTheNmeaFileAndLaterOnesAppend) {
     EXPECT_EQ(vox_SetEpochNavSolutionEx(s, &sol), 0);
     EXPECT_EQ(vox_SetEpochNavSolutionEx(s, &sol), 0);
     EXPECT_EQ(vox_CloseEpochStream(s), 1);
-    const std::string text = ReadText(path);
+    const std::string text = ReadFile(path);
     EXPECT_EQ(text.find("left over"), std::string::npos);
     EXPECT_EQ(Count(text, "$GPZDA"), 1u) << "each stream starts a fresh file";
     EXPECT_EQ(Count(text, "$GPGGA"), 2u);
