@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <array>
 #include <cstring>
 
 #include "raw/preparation_listing.h"
@@ -164,13 +165,9 @@ TEST(ScanStatus, MissingFileAndForeignFile) {
   EXPECT_EQ(missing.log, "Can not open file: /nonexistent/vox/file.bin\n");
 
   ScanRun foreign;
-  foreign.Run(test::TempRawFile(std::vector<uint8_t>(100, 'z')).path());
-  ScanRun foreign2;
-  RawWriter junk;
-  junk.Bytes(std::vector<uint8_t>(64, 'z'));
-  foreign2.Run(junk);
-  EXPECT_EQ(foreign2.status, kScanNotUsable);
-  EXPECT_EQ(foreign2.log, "");
+  foreign.Run(test::TempRawFile(std::vector<uint8_t>(64, 'z')).path());
+  EXPECT_EQ(foreign.status, kScanNotUsable);
+  EXPECT_EQ(foreign.log, "");
 }
 
 TEST(ScanStatus, EarlyEndKeepsEpochsButDecidesNothing) {
@@ -215,33 +212,24 @@ TEST(ScanStatus, BadLengthEndsTheWalkAsUnusable) {
 
 // ---- epochs, intervals and occupations
 
-TEST(ScanEpochs, IntervalIgnoresOneGapAndOutOfRangeSpacings) {
-  RawWriter w;
-  Start(w);
-  Epochs(w, {1000, 2000, 3000, 8000, 9000, 9001, 9002, 9003, 3609003});
-  w.EndOfData();
-  ScanRun run;
-  run.Run(w);
-  // Spacings: 1000 x3, 5000, 1, 1, 1 (ignored), 3600000 (ignored).
-  EXPECT_EQ(run.file->epoch_interval_ms, 1000u);
-
-  RawWriter one;
-  Start(one);
-  Epochs(one, {1000});
-  one.EndOfData();
-  ScanRun single;
-  single.Run(one);
-  EXPECT_EQ(single.file->epoch_interval_ms, 0u);
-}
-
-TEST(ScanEpochs, EqualCountsKeepTheIntervalSeenFirst) {
-  RawWriter w;
-  Start(w);
-  Epochs(w, {1000, 3000, 5000, 6000, 7000});  // 2000, 2000, 1000, 1000
-  w.EndOfData();
-  ScanRun run;
-  run.Run(w);
-  EXPECT_EQ(run.file->epoch_interval_ms, 2000u);
+// The file's interval: the most frequent spacing, out-of-range spacings ignored, the one seen
+// first on equal counts, none for a single epoch.
+TEST(ScanEpochs, IntervalIsTheMostFrequentSpacingInRange) {
+  const std::pair<std::vector<uint32_t>, uint32_t> cases[] = {
+      // Spacings: 1000 x3, 5000, 1, 1, 1 (ignored), 3600000 (ignored).
+      {{1000, 2000, 3000, 8000, 9000, 9001, 9002, 9003, 3609003}, 1000},
+      {{1000, 3000, 5000, 6000, 7000}, 2000},  // 2000, 2000, 1000, 1000
+      {{1000}, 0},
+  };
+  for (const auto& [epochs, interval] : cases) {
+    RawWriter w;
+    Start(w);
+    Epochs(w, epochs);
+    w.EndOfData();
+    ScanRun run;
+    run.Run(w);
+    EXPECT_EQ(run.file->epoch_interval_ms, interval) << epochs.size() << " epochs";
+  }
 }
 
 TEST(ScanEpochs, EpochBeforeTheReferenceTimeOfDayIsOnTheNextDay) {
@@ -374,28 +362,27 @@ void C2Epochs(RawWriter& w, unsigned sat, int bin, int count, uint32_t& ms) {
   }
 }
 
+// Scans a file of C2Epochs runs: (satellite, bin, count) each.
+void ScanC2Runs(ScanRun& run, std::initializer_list<std::array<int, 3>> runs) {
+  RawWriter w;
+  Start(w);
+  uint32_t ms = 1000;
+  for (const auto& [sat, bin, count] : runs)
+    C2Epochs(w, static_cast<unsigned>(sat), bin, count, ms);
+  w.EndOfData();
+  run.Run(w);
+}
+
 TEST(ScanC2, TenAgainstSevenDisablesTenAgainstSixDecides) {
   {
-    RawWriter w;
-    Start(w);
-    uint32_t ms = 1000;
-    C2Epochs(w, 4, 3, 10, ms);
-    C2Epochs(w, 5, 7, 7, ms);
-    w.EndOfData();
     ScanRun run;
-    run.Run(w);
+    ScanC2Runs(run, {{4, 3, 10}, {5, 7, 7}});
     EXPECT_NE(run.log.find("GPS C2 disabled\n"), std::string::npos);
     EXPECT_EQ(run.file->c2_usable_mask, 0u);
   }
   {
-    RawWriter w;
-    Start(w);
-    uint32_t ms = 1000;
-    C2Epochs(w, 4, 3, 10, ms);
-    C2Epochs(w, 5, 7, 6, ms);
-    w.EndOfData();
     ScanRun run;
-    run.Run(w);
+    ScanC2Runs(run, {{4, 3, 10}, {5, 7, 6}});
     EXPECT_DOUBLE_EQ(run.file->c2_l2_offset, 3 / 12.0);
     EXPECT_NE(run.log.find("GPS C2-L2: "), std::string::npos) << run.log;
     EXPECT_NE(run.log.find("G04 C2-L2: "), std::string::npos);
@@ -406,23 +393,12 @@ TEST(ScanC2, TenAgainstSevenDisablesTenAgainstSixDecides) {
 }
 
 TEST(ScanC2, MeanAndOffsetAreLogged) {
-  RawWriter w;
-  Start(w);
-  uint32_t ms = 1000;
-  C2Epochs(w, 1, 0, 4, ms);
-  w.EndOfData();
   ScanRun run;
-  run.Run(w);
+  ScanC2Runs(run, {{1, 0, 4}});
   EXPECT_NE(run.log.find("GPS C2-L2: 0.041667 0.000000\nG01 C2-L2: 0.041667 0.000000\n"),
             std::string::npos)
       << run.log;
 }
-
-}  // namespace
-}  // namespace vox
-
-namespace vox {
-namespace {
 
 TEST(ScanRecords, RecordsFailingTheirChecksAreDroppedSilently) {
   RawWriter w(RawOrder::kBig);
