@@ -31,11 +31,17 @@ struct Walk {
   bool reached_end = false;
 };
 
-Walk WalkFile(const voxtools::RawWriter& w) {
-  test::TempRawFile f(w);
+// A written file opened through the library's file object, with a reader over it.
+struct OpenedFile {
+  explicit OpenedFile(const RawWriter& w) : raw(w) { EXPECT_TRUE(file.OpenRead(raw.path())); }
+  test::TempRawFile raw;
   TBufFile file;
-  EXPECT_TRUE(file.OpenRead(f.path()));
-  RecordReader reader(file);
+  RecordReader reader{file};
+};
+
+Walk WalkFile(const voxtools::RawWriter& w) {
+  OpenedFile f(w);
+  RecordReader& reader = f.reader;
   Walk walk;
   const RawStart start = reader.Start();
   walk.start_status = start.status;
@@ -97,10 +103,8 @@ TEST_P(RecordReaderTest, OverLongRecordIsReadAndTheNextFoundByItsLength) {
   w.Begin(3).U32(0).U32(5000).U32(100).Zeros(37).End();  // 37 bytes the decoder ignores
   w.TimeRef("GPS", {7000, 101});
   w.EndOfData();
-  test::TempRawFile f(w);
-  TBufFile file;
-  ASSERT_TRUE(file.OpenRead(f.path()));
-  RecordReader reader(file);
+  OpenedFile f(w);
+  RecordReader& reader = f.reader;
   ASSERT_EQ(reader.Start().status, 0);
   ASSERT_EQ(reader.Next(), ReadResult::kOk);
   TimeRefRecord t;
@@ -133,10 +137,8 @@ TEST_P(RecordReaderTest, RecordPositionsLeadBackToTheirRecords) {
   w.Header().Receiver("a", "b", "c", "d", "e");
   const size_t time_ref_at = w.offset();
   w.TimeRef("UTC", {1, 2}, 9, 18).EndOfData();
-  test::TempRawFile f(w);
-  TBufFile file;
-  ASSERT_TRUE(file.OpenRead(f.path()));
-  RecordReader reader(file);
+  OpenedFile f(w);
+  RecordReader& reader = f.reader;
   ASSERT_EQ(reader.Start().status, 0);
   ASSERT_EQ(reader.Next(), ReadResult::kOk);
   ASSERT_EQ(reader.Next(), ReadResult::kOk);
@@ -156,10 +158,8 @@ TEST_P(RecordReaderTest, LongStringKeepsItsCapacityAndTheNextFieldFollowsIt) {
   RawWriter w = Writer();
   const std::string thirty(30, 'x');
   w.Header().Receiver("first", "second", thirty, "model", "v1").EndOfData();
-  test::TempRawFile f(w);
-  TBufFile file;
-  ASSERT_TRUE(file.OpenRead(f.path()));
-  RecordReader reader(file);
+  OpenedFile f(w);
+  RecordReader& reader = f.reader;
   ASSERT_EQ(reader.Start().status, 0);
   ASSERT_EQ(reader.Next(), ReadResult::kOk);
   ReceiverRecord r;
@@ -180,10 +180,8 @@ void WithRecord(RawOrder order, const std::function<void(RawWriter&)>& build, Fn
   w.Header();
   build(w);
   w.EndOfData();
-  test::TempRawFile f(w);
-  TBufFile file;
-  ASSERT_TRUE(file.OpenRead(f.path()));
-  RecordReader reader(file);
+  OpenedFile f(w);
+  RecordReader& reader = f.reader;
   ASSERT_EQ(reader.Start().status, 0);
   ASSERT_EQ(reader.Next(), ReadResult::kOk);
   check(reader);

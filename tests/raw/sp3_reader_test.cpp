@@ -180,39 +180,7 @@ std::string DataFile(const char* name) {
   return std::string(VOX_SHARED_DIR) + "/data/gnss/" + name;
 }
 
-TEST(Sp3RealFiles, IgsFinalOrbits) {
-  TBufFile file;
-  ASSERT_TRUE(file.OpenRead(DataFile("igs15904.sp3")));
-  ASSERT_TRUE(IsPreciseOrbitFile(file));
-  PreciseStore store;
-  EXPECT_EQ(ReadPreciseOrbitFile(file, store), kPreciseFileComplete);
-
-  // 96 epochs of 15 minutes for GPS 1 to 32, nothing else.
-  for (unsigned i = 0; i < kSatIndexCount; ++i)
-    EXPECT_EQ(store.count(i), i < 32 ? 96u : 0u) << i;
-
-  // Week 1590, second 345600 of the week, as the file's second header line says.
-  const uint32_t start = 1590 * 604800 + 345600;
-  const PreciseSample* g01 = store.first(SatIndexOf(kG01));
-  ASSERT_NE(g01, nullptr);
-  EXPECT_TRUE(g01->time == (TimeMs{start, 0}));
-  // "PG01  18392.619117   7490.690408 -17846.346485 999999.999999"
-  EXPECT_DOUBLE_EQ(g01->x, 18392619.117);
-  EXPECT_DOUBLE_EQ(g01->y, 7490690.408);
-  EXPECT_DOUBLE_EQ(g01->z, -17846346.485);
-  EXPECT_FLOAT_EQ(g01->clock, 0.999999999999f);
-  // "PG02 -14889.160729  -5131.952946 -21416.801336    269.108429"
-  const PreciseSample* g02 = store.first(SatIndexOf(MakeSatId(SatSystem::kGps, 2)));
-  EXPECT_DOUBLE_EQ(g02->x, -14889160.729);
-  EXPECT_FLOAT_EQ(g02->clock, 269.108429e-6f);
-  // Last epoch 23:45: "PG32  24669.573362  -7422.063705  -5325.411899    -28.330453"
-  const PreciseSample* g32 = store.last(SatIndexOf(MakeSatId(SatSystem::kGps, 32)));
-  EXPECT_TRUE(g32->time == (TimeMs{start + 85500, 0}));
-  EXPECT_DOUBLE_EQ(g32->y, -7422063.705);
-  EXPECT_DOUBLE_EQ(g32->z, -5325411.899);
-  EXPECT_FLOAT_EQ(g32->clock, -28.330453e-6f);
-}
-
+// Every sample of a real orbit file is compared with its text by the real-data tests.
 TEST(Sp3RealFiles, HeaderPaddedTo80ColumnsIsNotTaken) {
   TBufFile file;
   ASSERT_TRUE(file.OpenRead(DataFile("esa15253.sp3")));

@@ -258,26 +258,22 @@ class MalformedRinex : public ::testing::Test {
  protected:
   void SetUp() override {
     if (GnssDir().empty()) GTEST_SKIP() << "the real GNSS data is not present";
-    lines_ = ReadLines(GnssDir() + "/07590920.05o");
+    lines_ = Lines(GnssDir() + "/07590920.05o");
   }
-  static std::vector<std::string> ReadLines(const std::string& path) {
-    std::vector<std::string> lines;
-    std::ifstream in(path);
-    for (std::string l; std::getline(in, l);)
-      lines.push_back(l);
-    return lines;
-  }
-  std::string Write(const std::vector<std::string>& lines) {
-    const std::string path = scratch_.File("bad.05o");
+  std::string Write(const std::vector<std::string>& lines, const std::string& name = "bad.05o") {
+    const std::string path = scratch_.File(name);
     std::ofstream out(path);
     for (const std::string& l : lines)
       out << l << "\n";
     return path;
   }
   // Converts, expecting failure; the output's folder must hold nothing new afterwards.
-  std::string Fail(const std::string& obs) {
+  std::string Fail(const std::string& obs, const std::vector<std::string>& navs = {}) {
     const std::set<std::string> before = Names();
-    const ToolRun r = RunVoxraw({"from-rinex", obs, "-o", out_}, scratch_.path().string());
+    std::vector<std::string> args = {"from-rinex", obs};
+    args.insert(args.end(), navs.begin(), navs.end());
+    args.insert(args.end(), {"-o", out_});
+    const ToolRun r = RunVoxraw(args, scratch_.path().string());
     EXPECT_EQ(r.exit_code, 1);
     EXPECT_EQ(Names(), before);
     return r.err;
@@ -322,20 +318,10 @@ TEST_F(MalformedRinex, FailureKeepsAnEarlierFileUnderTheOutputName) {
 }
 
 TEST_F(MalformedRinex, DamagedNavigationRecordNamesTheNavigationFile) {
-  std::vector<std::string> nav = ReadLines(GnssDir() + "/07590920.05n");
+  std::vector<std::string> nav = Lines(GnssDir() + "/07590920.05n");
   nav[14].replace(10, 5, "#####");  // an orbit line of the first record
-  const std::string nav_path = scratch_.File("bad.05n");
-  {
-    std::ofstream out(nav_path);
-    for (const std::string& l : nav)
-      out << l << "\n";
-  }
-  const std::set<std::string> before = Names();
-  const ToolRun r = RunVoxraw({"from-rinex", GnssDir() + "/07590920.05o", nav_path, "-o", out_},
-                              scratch_.path().string());
-  EXPECT_EQ(r.exit_code, 1);
-  EXPECT_NE(r.err.find("bad.05n:15:"), std::string::npos) << r.err;
-  EXPECT_EQ(Names(), before);
+  const std::string err = Fail(GnssDir() + "/07590920.05o", {Write(nav, "bad.05n")});
+  EXPECT_NE(err.find("bad.05n:15:"), std::string::npos) << err;
 }
 
 // ---- the precise orbit file
@@ -373,6 +359,10 @@ TEST(PreciseOrbitFile, EverySampleReachesThePreciseStreamAsTheTextStatesIt) {
     EXPECT_FALSE(GetNextPrecise(*cursor, extra));
   }
   EXPECT_EQ(checked, 96u * 32u);
+  size_t stored = 0;
+  for (unsigned i = 0; i < kSatIndexCount; ++i)
+    stored += store.count(i);
+  EXPECT_EQ(stored, checked) << "samples of satellites the file does not name";
 }
 
 }  // namespace
