@@ -4,22 +4,16 @@
 #include <cmath>
 #include <cstdlib>
 #include <filesystem>
-#include <fstream>
 #include <sstream>
 #include <stdexcept>
+
+#include "support/scratch.h"
 
 namespace vox::test {
 
 namespace fs = std::filesystem;
 
 namespace {
-
-std::string Slurp(const std::string& path) {
-  std::ifstream in(path, std::ios::binary);
-  std::ostringstream s;
-  s << in.rdbuf();
-  return s.str();
-}
 
 std::string Cut(const std::string& line, size_t at, size_t n) {
   return at >= line.size() ? std::string() : line.substr(at, n);
@@ -34,17 +28,6 @@ double Num(std::string s) {
   return std::strtod(s.c_str(), nullptr);
 }
 
-std::vector<std::string> Lines(const std::string& path) {
-  std::vector<std::string> lines;
-  std::istringstream in(Slurp(path));
-  std::string line;
-  while (std::getline(in, line)) {
-    if (!line.empty() && line.back() == '\r') line.pop_back();
-    lines.push_back(line);
-  }
-  return lines;
-}
-
 std::string Quote(const std::string& s) {
   std::string q = "'";
   for (char c : s)
@@ -53,6 +36,17 @@ std::string Quote(const std::string& s) {
 }
 
 }  // namespace
+
+std::vector<std::string> Lines(const std::string& path) {
+  std::vector<std::string> lines;
+  std::istringstream in(ReadFile(path));
+  std::string line;
+  while (std::getline(in, line)) {
+    if (!line.empty() && line.back() == '\r') line.pop_back();
+    lines.push_back(line);
+  }
+  return lines;
+}
 
 std::string GnssDir() {
   const std::string dir = std::string(VOX_SHARED_DIR) + "/data/gnss";
@@ -68,8 +62,8 @@ ToolRun RunVoxraw(const std::vector<std::string>& args, const std::string& scrat
   ToolRun r;
   const int status = std::system(command.c_str());
   r.exit_code = WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-  r.out = Slurp(out);
-  r.err = Slurp(err);
+  r.out = ReadFile(out);
+  r.err = ReadFile(err);
   fs::remove(out);
   fs::remove(err);
   return r;
