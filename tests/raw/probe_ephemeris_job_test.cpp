@@ -5,7 +5,6 @@
 // after the documented unit and layout conversions.
 #include <gtest/gtest.h>
 
-#include <cctype>
 #include <cmath>
 #include <cstring>
 #include <filesystem>
@@ -256,21 +255,16 @@ class ProbeEphemerisJobTest : public ::testing::Test {
     b.EndOfData();
     ASSERT_TRUE(b.Save(scratch_.File("b.raw")));
 
-    const std::string job = WriteFile(
-        scratch_.File("job.txt"),
-        JobText("Ephemeris", scratch_.File("job.res"),
-                "Type=1\nRawfiltPath=" PROBE_ENGINE_DIR
-                "test_schedule.eng\nEnginePath=" PROBE_ENGINE_DIR "test_probe.eng\nProbeOut=" +
-                    scratch_.File("probe.txt") +
-                    "\nProbeEphemeris=G5,G35,R7,E11,C3,S20,S22\n"
-                    "NumFiles=3\nNumPoints=2\nNumOccups=2\nNumVectors=1\n"
-                    "[FILE:1]\nName=a.raw\n[FILE:2]\nName=b.raw\n[FILE:3]\nName=" +
-                    kSp3 +
-                    "\n[POINT:1]\nName=Base\n[POINT:2]\nName=Rover\n"
-                    "[OCCUP:1]\nFile=1\nPoint=1\n[OCCUP:2]\nFile=2\nPoint=2\n"
-                    "[VECTOR:1]\nPoints=1,2\n"));
-    ASSERT_EQ(RunVoxrun(job), 0);
-    probe_ = Lines(ReadFile(scratch_.File("probe.txt")));
+    const ProbeRun run = RunProbeJob(scratch_, "Ephemeris",
+                                     "ProbeEphemeris=G5,G35,R7,E11,C3,S20,S22\n"
+                                     "NumFiles=3\nNumPoints=2\nNumOccups=2\nNumVectors=1\n"
+                                     "[FILE:1]\nName=a.raw\n[FILE:2]\nName=b.raw\n[FILE:3]\nName=" +
+                                         kSp3 +
+                                         "\n[POINT:1]\nName=Base\n[POINT:2]\nName=Rover\n"
+                                         "[OCCUP:1]\nFile=1\nPoint=1\n[OCCUP:2]\nFile=2\nPoint=2\n"
+                                         "[VECTOR:1]\nPoints=1,2\n");
+    ASSERT_EQ(run.exit_code, 0);
+    probe_ = run.report;
     for (const std::string& text : temp_.EngineLogTexts())
       log_ += text;
   }
@@ -325,27 +319,12 @@ TEST_F(ProbeEphemerisJobTest, TheEngineLogHoldsTheScanAndTheListing) {
   ASSERT_NE(first, std::string::npos) << log_;
   EXPECT_NE(log_.find(report, first + 1), std::string::npos);
 
-  // The listing: every broadcast ephemeris by satellite index, in time order, the duplicate
-  // of G5 dropped; the precise samples per satellite; the occupations and the vector.
+  // The listing, after every file was scanned: the broadcast ephemerides (the store's content
+  // shows in the streams below, the listing's form in its own test), the precise samples per
+  // satellite (G5: 96 of the orbit file, one of the raw file), the occupations and the vector.
   const std::vector<std::string> lines = Lines(log_);
-  std::vector<std::string> ephemeris;
-  for (const std::string& l : lines)
-    if (l.size() > 12 && std::isdigit(static_cast<unsigned char>(l[0])) && l[3] == ' ')
-      ephemeris.push_back(l.substr(0, l.find('.') + 4));  // up to the calendar text
-  const std::vector<std::string> want = {
-      "005 - G05 - " + std::to_string(kDaySeconds + 28800) + ".000",
-      "005 - G05 - " + std::to_string(kDaySeconds + 36000) + ".000",
-      "005 - G05 - " + std::to_string(kDaySeconds + 43200) + ".000",
-      "005 - G05 - " + std::to_string(kDaySeconds + 50400) + ".000",
-      "035 - J03 - " + std::to_string(kDaySeconds + 36000) + ".000",
-      "044 - R07 - " + std::to_string(kDaySeconds + 36000) + ".000",
-      "064 - C03 - " + std::to_string(kDaySeconds + 36000) + ".000",
-      "109 - E11 - " + std::to_string(kDaySeconds + 36000) + ".000",
-      "129 - S20 - " + std::to_string(kDaySeconds + 36010) + ".000",
-      "131 - S22 - " + std::to_string(kDaySeconds + 36000) + ".000",
-  };
-  EXPECT_EQ(ephemeris, want) << log_;
   EXPECT_NE(log_.find("\n005 - G05 - 1140861600.000 01 Mar 2016 10:00:00\n"), std::string::npos);
+  EXPECT_NE(log_.find("\n131 - S22 - 1140861600.000 "), std::string::npos);
   const size_t listing = log_.find("Ephemeris:\n");
   const size_t precise = log_.find("\nPrecise Ephemeris:\n");
   const size_t occupations = log_.find("Occupation:\n");
@@ -354,15 +333,8 @@ TEST_F(ProbeEphemerisJobTest, TheEngineLogHoldsTheScanAndTheListing) {
   ASSERT_NE(occupations, std::string::npos);
   EXPECT_LT(listing, precise);
   EXPECT_LT(precise, occupations);
-  // G5: 96 samples of the orbit file and one of the raw file; G1 only the file's.
-  EXPECT_EQ(WithPrefix(lines, "G05 - ").size(), 1u);
+  ASSERT_EQ(WithPrefix(lines, "G05 - ").size(), 1u);
   EXPECT_TRUE(WithPrefix(lines, "G05 - ").front().ends_with(" - 97")) << log_;
-  ASSERT_EQ(WithPrefix(lines, "G01 - ").size(), 1u);
-  EXPECT_TRUE(WithPrefix(lines, "G01 - ").front().ends_with(" - 96"));
-  ASSERT_EQ(WithPrefix(lines, "R07 - ").size(), 1u);
-  EXPECT_TRUE(WithPrefix(lines, "R07 - ").front().ends_with(" - 2"));
-  ASSERT_EQ(WithPrefix(lines, "E11 - ").size(), 1u);
-  EXPECT_TRUE(WithPrefix(lines, "E11 - ").front().ends_with(" - 1"));
   for (const char* occupation : {"OCCUP#02000001 Base, beg=", "OCCUP#02000002 Rover, beg="}) {
     const auto found = WithPrefix(lines, occupation);
     ASSERT_EQ(found.size(), 1u) << log_;

@@ -40,73 +40,38 @@ struct Written {
   uint8_t b2, b3;
 };
 
+// Code pr + base + k and phase ph + base + k in slot k - 1, for k = 1 to count.
+std::vector<SignalValue> Slots(int count, double pr, double ph, double base) {
+  std::vector<SignalValue> values;
+  for (int k = 1; k <= count; ++k)
+    values.push_back({k - 1, pr + base + k, ph + base + k});
+  return values;
+}
+
 // The satellites of epoch e. Every system that has L2 signals carries all its slots on one
 // satellite, so that the file's signal masks are complete and no force-copy rule applies.
 std::vector<Written> Satellites(uint8_t tag, uint32_t e) {
   const double pr = 2.0e7 + 1000.0 * e, ph = 1.1e8 + 0.25 + e;
-  std::vector<Written> sats;
+  // G1: every slot, L2C phase an integer away from L2P phase (agreeing, offset 0).
+  std::vector<SignalValue> g1 = Slots(tag == 51 ? 5 : 4, pr, ph, 0);
+  g1[2].phase = ph + 8, g1[3].phase = ph + 3;
+  std::vector<Written> sats = {{'G', 1, g1, 1, 2}};
   if (tag == 51) {
-    // G1: every slot, L2C phase an integer away from L2P phase (agreeing, offset 0).
-    sats.push_back({'G',
-                    1,
-                    {{0, pr + 1, ph + 1},
-                     {1, pr + 2, ph + 2},
-                     {2, pr + 3, ph + 8},
-                     {3, pr + 4, ph + 3},
-                     {4, pr + 5, ph + 5}},
-                    1,
-                    2});
     // G2: no L2C phase, so L2P code and phase stand in for L2C.
     sats.push_back({'G', 2, {{0, pr + 21, {}}, {3, pr + 24, ph + 24}}, 3, 4});
     // G3: an L2C phase without L2P: kept as it is.
     sats.push_back({'G', 3, {{0, pr + 31, ph + 31}, {2, {}, ph + 33}}, 5, 6});
     sats.push_back({'G', 35, {{0, pr + 351, {}}, {4, pr + 355, ph + 355}}, 7, 8});
-    sats.push_back({'R',
-                    7,
-                    {{0, pr + 71, ph + 71},
-                     {1, pr + 72, ph + 72},
-                     {2, pr + 73, ph + 73},
-                     {3, pr + 74, ph + 74}},
-                    9,
-                    10});
+    sats.push_back({'R', 7, Slots(4, pr, ph, 70), 9, 10});
     // R8: a zero code counts as present; a code and a phase beyond their windows do not.
     sats.push_back({'R', 8, {{0, 0.0, {}}, {1, kFailsCheck, kPhaseFailsCheck}}, 11, 12});
-    sats.push_back({'E',
-                    11,
-                    {{0, pr + 111, ph + 111},
-                     {1, pr + 112, ph + 112},
-                     {2, pr + 113, ph + 113},
-                     {3, pr + 114, ph + 114},
-                     {4, pr + 115, ph + 115}},
-                    13,
-                    14});
-    sats.push_back({'C',
-                    3,
-                    {{0, pr + 31, ph + 31},
-                     {1, pr + 32, ph + 32},
-                     {2, pr + 33, ph + 33},
-                     {3, pr + 34, ph + 34},
-                     {4, pr + 35, ph + 35}},
-                    15,
-                    16});
+    sats.push_back({'E', 11, Slots(5, pr, ph, 110), 13, 14});
+    sats.push_back({'C', 3, Slots(5, pr, ph, 30), 15, 16});
     sats.push_back({'S', 20, {{0, pr + 201, ph + 201}, {4, pr + 205, {}}}, 17, 18});
   } else {
-    sats.push_back(
-        {'G',
-         1,
-         {{0, pr + 1, ph + 1}, {1, pr + 2, ph + 2}, {2, pr + 3, ph + 8}, {3, pr + 4, ph + 3}},
-         1,
-         2});
     sats.push_back({'G', 2, {{0, pr + 21, {}}, {3, pr + 24, ph + 24}}, 3, 4});
     sats.push_back({'G', 35, {{0, pr + 351, ph + 351}}, 7, 8});
-    sats.push_back({'R',
-                    7,
-                    {{0, pr + 71, ph + 71},
-                     {1, pr + 72, ph + 72},
-                     {2, pr + 73, ph + 73},
-                     {3, pr + 74, ph + 74}},
-                    9,
-                    10});
+    sats.push_back({'R', 7, Slots(4, pr, ph, 70), 9, 10});
     sats.push_back({'R', 8, {{0, 0.0, {}}, {1, kFailsCheck, kPhaseFailsCheck}}, 11, 12});
     sats.push_back({'S', 20, {{0, pr + 201, ph + 201}}, 17, 18});
   }
@@ -217,17 +182,11 @@ class ProbeEpochJobTest : public ::testing::Test {
       sections += "[FILE:" + n + "]\nName=" + kFiles[i].name + "\n[OCCUP:" + n + "]\nFile=" + n +
                   "\nPoint=1\n";
     }
-    const std::string job = WriteFile(
-        scratch_.File("job.txt"),
-        JobText("Epochs", scratch_.File("job.res"),
-                "Type=1\nRawfiltPath=" PROBE_ENGINE_DIR
-                "test_schedule.eng\nEnginePath=" PROBE_ENGINE_DIR "test_probe.eng\nProbeOut=" +
-                    scratch_.File("probe.txt") +
-                    "\nProbeEpochs=1\nNumFiles=4\nNumPoints=1\nNumOccups=4\n"
-                    "[POINT:1]\nName=Here\n" +
-                    sections));
-    ASSERT_EQ(RunVoxrun(job), 0);
-    probe_ = Lines(ReadFile(scratch_.File("probe.txt")));
+    const ProbeRun run = RunProbeJob(
+        scratch_, "Epochs",
+        "ProbeEpochs=1\nNumFiles=4\nNumPoints=1\nNumOccups=4\n[POINT:1]\nName=Here\n" + sections);
+    ASSERT_EQ(run.exit_code, 0);
+    probe_ = run.report;
     for (const std::string& text : temp_.EngineLogTexts())
       log_ += text;
   }
@@ -311,16 +270,12 @@ TEST(ProbeEpochJob, APhaseThatIsNotANumberIsDroppedAndTheEpochGoesOn) {
              Sat(51, 'G', 2, {{0, 2.2e7, 1.2e8}})});
   w.EndOfData();
   ASSERT_TRUE(w.Save(scratch.File("a.raw")));
-  const std::string job = WriteFile(
-      scratch.File("job.txt"),
-      JobText("NaN", scratch.File("job.res"),
-              "Type=1\nRawfiltPath=" PROBE_ENGINE_DIR
-              "test_schedule.eng\nEnginePath=" PROBE_ENGINE_DIR "test_probe.eng\nProbeOut=" +
-                  scratch.File("probe.txt") +
-                  "\nProbeEpochs=1\nNumFiles=1\nNumPoints=1\nNumOccups=1\n[POINT:1]\nName=P\n"
-                  "[FILE:1]\nName=a.raw\n[OCCUP:1]\nFile=1\nPoint=1\n"));
-  ASSERT_EQ(RunVoxrun(job), 0);
-  const std::vector<std::string> probe = Lines(ReadFile(scratch.File("probe.txt")));
+  const ProbeRun run =
+      RunProbeJob(scratch, "NaN",
+                  "ProbeEpochs=1\nNumFiles=1\nNumPoints=1\nNumOccups=1\n[POINT:1]\nName=P\n"
+                  "[FILE:1]\nName=a.raw\n[OCCUP:1]\nFile=1\nPoint=1\n");
+  ASSERT_EQ(run.exit_code, 0);
+  const std::vector<std::string>& probe = run.report;
   const auto sats = WithPrefix(probe, "sat occ=02000001 ");
   ASSERT_EQ(sats.size(), 6u);
   EXPECT_EQ(Field(sats[1], "id"), "0108");

@@ -12,6 +12,8 @@
 #include <string>
 #include <vector>
 
+#include "support/scratch.h"
+
 namespace vox::test {
 
 #define PROBE_ENGINE_DIR VOX_TEST_ENGINE_DIR "/"
@@ -60,6 +62,26 @@ inline std::vector<uint8_t> FromHex(const std::string& hex) {
   for (size_t i = 0; i + 1 < hex.size(); i += 2)
     bytes.push_back(static_cast<uint8_t>(std::stoul(hex.substr(i, 2), nullptr, 16)));
   return bytes;
+}
+
+// Runs a job written to job.txt of the scratch folder, with the schedule engine as raw filter
+// and the probe as processing engine reporting to probe.txt; lines follow the job's own.
+struct ProbeRun {
+  int exit_code = -1;
+  std::vector<std::string> report;
+};
+inline ProbeRun RunProbeJob(const ScratchDir& scratch, const std::string& name,
+                            const std::string& lines) {
+  const std::string job =
+      WriteFile(scratch.File("job.txt"), JobText(name, scratch.File("job.res"),
+                                                 "Type=1\nRawfiltPath=" PROBE_ENGINE_DIR
+                                                 "test_schedule.eng\nEnginePath=" PROBE_ENGINE_DIR
+                                                 "test_probe.eng\nProbeOut=" +
+                                                     scratch.File("probe.txt") + "\n" + lines));
+  ProbeRun run;
+  run.exit_code = RunVoxrun(job);
+  run.report = Lines(ReadFile(scratch.File("probe.txt")));
+  return run;
 }
 
 }  // namespace vox::test
