@@ -58,6 +58,21 @@ vox_GpsOrbitParams ThroughRawRecord(const vox_GpsOrbitParams& p, unsigned prn,
   return out;
 }
 
+// Every orbit and clock value of two parameter sets, compared exactly.
+void ExpectSameOrbit(const vox_GpsOrbitParams& q, const vox_GpsOrbitParams& p) {
+  EXPECT_EQ(q.week, p.week);
+  EXPECT_EQ(q.toe, p.toe);
+  EXPECT_EQ(q.toc, p.toc);
+  const double expected[] = {p.sqrt_a, p.e,   p.i0,   p.omega0,  p.omega,     p.m0,   p.af0,
+                             p.af1,    p.tgd, p.tgd2, p.delta_n, p.omega_dot, p.idot, p.cuc,
+                             p.cus,    p.crc, p.crs,  p.cic,     p.cis};
+  const double got[] = {q.sqrt_a, q.e,   q.i0,   q.omega0,  q.omega,     q.m0,   q.af0,
+                        q.af1,    q.tgd, q.tgd2, q.delta_n, q.omega_dot, q.idot, q.cuc,
+                        q.cus,    q.crc, q.crs,  q.cic,     q.cis};
+  for (size_t k = 0; k < std::size(expected); ++k)
+    EXPECT_EQ(got[k], expected[k]) << k;
+}
+
 TEST(FieldConventions, RawRecordRoundTripKeepsEveryValue) {
   const voxsim::Survey s = TestSurvey();
   for (auto order : {voxtools::RawOrder::kLittle, voxtools::RawOrder::kBig}) {
@@ -66,27 +81,7 @@ TEST(FieldConventions, RawRecordRoundTripKeepsEveryValue) {
     const vox_GpsOrbitParams q = ThroughRawRecord(p, s.satellites[3].prn, order, &passes);
     EXPECT_TRUE(passes);
     // The simulator quantises to the field widths, so nothing may change on the way.
-    EXPECT_EQ(q.week, p.week);
-    EXPECT_EQ(q.toe, p.toe);
-    EXPECT_EQ(q.toc, p.toc);
-    EXPECT_EQ(q.sqrt_a, p.sqrt_a);
-    EXPECT_EQ(q.e, p.e);
-    EXPECT_EQ(q.i0, p.i0);
-    EXPECT_EQ(q.omega0, p.omega0);
-    EXPECT_EQ(q.omega, p.omega);
-    EXPECT_EQ(q.m0, p.m0);
-    EXPECT_EQ(q.delta_n, p.delta_n);
-    EXPECT_EQ(q.omega_dot, p.omega_dot);
-    EXPECT_EQ(q.idot, p.idot);
-    EXPECT_EQ(q.cuc, p.cuc);
-    EXPECT_EQ(q.cus, p.cus);
-    EXPECT_EQ(q.crc, p.crc);
-    EXPECT_EQ(q.crs, p.crs);
-    EXPECT_EQ(q.cic, p.cic);
-    EXPECT_EQ(q.cis, p.cis);
-    EXPECT_EQ(q.af0, p.af0);
-    EXPECT_EQ(q.af1, p.af1);
-    EXPECT_EQ(q.tgd, p.tgd);
+    ExpectSameOrbit(q, p);
     EXPECT_EQ(q.iode, p.iode);
   }
 }
@@ -151,17 +146,7 @@ TEST(FieldConventions, GalileoRecordRoundTrip) {
   vox_GpsOrbitParams q{};
   EXPECT_EQ(vox_GpsOrbitFromEphemeris(&full, &q), 0);  // not a GPS-layout record
   ASSERT_EQ(vox_GalileoOrbitFromEphemeris(&full, &q), 1);
-  EXPECT_EQ(q.week, p.week);
-  EXPECT_EQ(q.toe, p.toe);
-  EXPECT_EQ(q.toc, p.toc);
-  const double expected[] = {p.sqrt_a, p.e,   p.i0,   p.omega0,  p.omega,     p.m0,   p.af0,
-                             p.af1,    p.tgd, p.tgd2, p.delta_n, p.omega_dot, p.idot, p.cuc,
-                             p.cus,    p.crc, p.crs,  p.cic,     p.cis};
-  const double got[] = {q.sqrt_a, q.e,   q.i0,   q.omega0,  q.omega,     q.m0,   q.af0,
-                        q.af1,    q.tgd, q.tgd2, q.delta_n, q.omega_dot, q.idot, q.cuc,
-                        q.cus,    q.crc, q.crs,  q.cic,     q.cis};
-  for (size_t k = 0; k < std::size(expected); ++k)
-    EXPECT_EQ(got[k], expected[k]) << k;
+  ExpectSameOrbit(q, p);
   EXPECT_EQ(q.iode, 77u);
   EXPECT_EQ(q.ura, 107u);
 }
