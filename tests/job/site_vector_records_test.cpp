@@ -95,15 +95,6 @@ TEST_F(SiteRecordsTest, PointOfJobTypeOneIsReportedAsTypeTwo) {
   EXPECT_EQ(site.site_type, VOX_SITE_NONE);
 }
 
-TEST_F(SiteRecordsTest, PointStreamYieldsThePointsInOrder) {
-  job.points.Append(new TPointItem(4, *job.FindPoint(2)));
-  PointCursor cursor(job.points.head());
-  for (uint32_t n = 1; n <= 4; ++n)
-    EXPECT_EQ(cursor.Next()->id, 0x01000000u + n);
-  EXPECT_EQ(cursor.Next(), nullptr);
-  EXPECT_EQ(cursor.Next(), nullptr);
-}
-
 class VectorRecordsTest : public ::testing::Test {
  protected:
   void SetUp() override { testing::BuildStreamJob(job); }
@@ -200,54 +191,35 @@ struct Block {
   uint8_t bytes[32];
 };
 
-TEST(ParameterAssign, CallerBlockOfAllocatedSizeZeroReceivesNothing) {
-  Block job_block(16, 16, 0x11);
-  Block caller(12, 0, 0x22);
-  AssignParameterBlock(caller.bytes, job_block.bytes);
-  EXPECT_EQ(caller.size(), 0u);
-  EXPECT_EQ(caller.allocated(), 0u);
-  EXPECT_EQ(caller.bytes[4], 0x22);
-}
-
-TEST(ParameterAssign, AllocatedSourceSetsTheDestinationsMeaningfulSize) {
-  Block source(10, 16, 0x11);
-  Block destination(0, 32, 0x22);
-  AssignParameterBlock(destination.bytes, source.bytes);
-  EXPECT_EQ(destination.size(), 10u);
-  EXPECT_EQ(destination.allocated(), 32u);
-  EXPECT_EQ(destination.bytes[9], 0x11);
-  EXPECT_EQ(destination.bytes[10], 0x22);
-
-  Block small(0, 8, 0x33);
-  AssignParameterBlock(small.bytes, source.bytes);
-  EXPECT_EQ(small.size(), 8u);
-  EXPECT_EQ(small.bytes[7], 0x11);
-  EXPECT_EQ(small.bytes[8], 0x33);
-}
-
-TEST(ParameterAssign, UnallocatedSourceCopiesTheSmallerSizeAndKeepsTheHeader) {
-  Block source(20, 0, 0x11);
-  Block destination(8, 32, 0x22);
-  AssignParameterBlock(destination.bytes, source.bytes);
-  EXPECT_EQ(destination.size(), 8u);
-  EXPECT_EQ(destination.bytes[7], 0x11);
-  EXPECT_EQ(destination.bytes[8], 0x22);
-}
-
-TEST(ParameterAssign, NeverCopiesBeyondTheHeaderForTinyOrLyingSizes) {
-  Block source(2, 16, 0x11);  // meaningful size inside the header
-  Block destination(0, 32, 0x22);
-  AssignParameterBlock(destination.bytes, source.bytes);
-  EXPECT_EQ(destination.size(), 2u);
-  EXPECT_EQ(destination.bytes[4], 0x22);
-
-  Block liar(30000, 12, 0x11);  // claims more than it holds
-  AssignParameterBlock(destination.bytes, liar.bytes);
-  EXPECT_EQ(destination.size(), 12u);
-  EXPECT_EQ(destination.bytes[12], 0x22);
-
-  AssignParameterBlock(nullptr, source.bytes);
-  AssignParameterBlock(destination.bytes, nullptr);
+// Each case: source and destination headers, then the destination's header after the copy
+// and the end of the payload bytes taken from the source (the rest keep the destination's).
+TEST(ParameterAssign, CopiesNoMoreThanBothHeadersAllow) {
+  struct Case {
+    const char* what;
+    uint16_t src_size, src_allocated, dst_size, dst_allocated;
+    uint16_t want_size, want_allocated, copied_to;
+  };
+  const Case cases[] = {
+      {"caller block of allocated size zero receives nothing", 16, 16, 12, 0, 0, 0, 4},
+      {"allocated source sets the destination's meaningful size", 10, 16, 0, 32, 10, 32, 10},
+      {"... limited by what the destination holds", 10, 16, 0, 8, 8, 8, 8},
+      {"unallocated source copies the smaller size, header kept", 20, 0, 8, 32, 8, 32, 8},
+      {"meaningful size inside the header copies nothing", 2, 16, 0, 32, 2, 32, 4},
+      {"a size beyond what the source holds", 30000, 12, 0, 32, 12, 32, 12},
+  };
+  for (const Case& c : cases) {
+    SCOPED_TRACE(c.what);
+    Block source(c.src_size, c.src_allocated, 0x11);
+    Block destination(c.dst_size, c.dst_allocated, 0x22);
+    AssignParameterBlock(destination.bytes, source.bytes);
+    EXPECT_EQ(destination.size(), c.want_size);
+    EXPECT_EQ(destination.allocated(), c.want_allocated);
+    for (uint16_t i = 4; i < sizeof destination.bytes; ++i)
+      ASSERT_EQ(destination.bytes[i], i < c.copied_to ? 0x11 : 0x22) << i;
+  }
+  Block block(4, 16, 0x11);
+  AssignParameterBlock(nullptr, block.bytes);
+  AssignParameterBlock(block.bytes, nullptr);
 }
 
 TEST(ParameterCompare, ComparesPayloadsOverTheSmallerMeaningfulSize) {
