@@ -18,33 +18,33 @@ PlotLine Parsed(const std::string& name) {
 }
 
 TEST(PlotLineNames, SatellitesAndSignals) {
-  PlotLine l = Parsed("G05-G12 L1");
-  EXPECT_EQ(l.sat_a, 5);
-  EXPECT_EQ(l.sat_b, 12);
-  EXPECT_EQ(l.flags, 0x100 | 1);
-
-  l = Parsed("R07 L2C");
-  EXPECT_EQ(l.sat_a, 135);
-  EXPECT_EQ(l.flags, 0x400 | 2);
-
-  EXPECT_EQ(Parsed("E11 IonoFree").flags, 5);
-  EXPECT_EQ(Parsed("E11 IonoFree").sat_a, 256 + 11);
-  EXPECT_EQ(Parsed("G05-G12 L1-L2").flags, 0x100 | 4);
-  EXPECT_EQ(Parsed("C30 B1I").flags, 0x400 | 1);
-  EXPECT_EQ(Parsed("G01 L1+L2").flags, 3);
-  EXPECT_EQ(Parsed("J02 E5AQ").flags, 6);
-  EXPECT_EQ(Parsed("G01L1").flags, 1);  // the signal may follow the digits directly
-
-  l = Parsed("Total");
-  EXPECT_EQ(l.flags, 0);
-  EXPECT_EQ(l.sat_a, 0);
-  EXPECT_EQ(l.sat_b, 0);
-  // A name that ends inside the satellite part, or right after it, has no signal part.
-  EXPECT_EQ(Parsed("G05").flags, 0);
-  EXPECT_EQ(Parsed("G05-G1").sat_b, 0);
-  EXPECT_EQ(Parsed("G05   ").flags, 0);
-  // Equality is over the whole rest: "L1 " is not "L1".
-  EXPECT_EQ(Parsed("G05 L1 ").flags, 0);
+  struct Case {
+    const char* name;
+    uint16_t flags, sat_a, sat_b;
+  };
+  const Case cases[] = {
+      {"G05-G12 L1", 0x100 | 1, 5, 12},
+      {"R07 L2C", 0x400 | 2, 135, 0},
+      {"E11 IonoFree", 5, 256 + 11, 0},
+      {"G05-G12 L1-L2", 0x100 | 4, 5, 12},
+      {"C30 B1I", 0x400 | 1, 320 + 30, 0},
+      {"G01 L1+L2", 3, 1, 0},
+      {"J02 E5AQ", 6, 192 + 2, 0},
+      {"G01L1", 1, 1, 0},  // the signal may follow the digits directly
+      {"Total", 0, 0, 0},
+      // A name that ends inside the satellite part, or right after it, has no signal part.
+      {"G05", 0, 5, 0},
+      {"G05-G1", 0, 5, 0},
+      {"G05   ", 0, 5, 0},
+      // Equality is over the whole rest: "L1 " is not "L1".
+      {"G05 L1 ", 0, 5, 0},
+  };
+  for (const Case& c : cases) {
+    const PlotLine l = Parsed(c.name);
+    EXPECT_EQ(l.flags, c.flags) << c.name;
+    EXPECT_EQ(l.sat_a, c.sat_a) << c.name;
+    EXPECT_EQ(l.sat_b, c.sat_b) << c.name;
+  }
 }
 
 class PlotStreamTest : public testing::Test {

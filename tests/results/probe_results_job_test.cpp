@@ -242,6 +242,13 @@ class ProbeResultsJobTest : public ::testing::Test {
     return out;
   }
 
+  static std::vector<uint8_t> Kinds(const std::vector<Record>& records) {
+    std::vector<uint8_t> kinds;
+    for (const Record& r : records)
+      kinds.push_back(r.kind);
+    return kinds;
+  }
+
   ScratchDir scratch_;
   TempDirEnv temp_{scratch_, true};
   std::string result_ = scratch_.File("job.res");
@@ -268,12 +275,8 @@ TEST_F(ProbeResultsJobTest, TheResultFileHoldsEveryFieldAsStored) {
   ASSERT_FALSE(read_.records.empty());
   EXPECT_EQ(read_.records.back().kind, 0);
   const std::vector<Record> r = EngineRecords();
-  const uint8_t kinds[] = {30, 39, 38, 52, 55, 33, 40, 40, 35, 41, 36, 36,
-                           36, 53, 53, 53, 53, 54, 54, 30, 55, 39, 53, 54};
-  std::vector<uint8_t> got;
-  for (const Record& rec : r)
-    got.push_back(rec.kind);
-  ASSERT_EQ(got, std::vector<uint8_t>(std::begin(kinds), std::end(kinds)));
+  ASSERT_EQ(Kinds(r), std::vector<uint8_t>({30, 39, 38, 52, 55, 33, 40, 40, 35, 41, 36, 36,
+                                            36, 53, 53, 53, 53, 54, 54, 30, 55, 39, 53, 54}));
 
   // Solution start: the type as sent, bits 25, 27 and 28 of the flags cleared.
   const auto& start = std::get<tools::SolutionStartRec>(r[0].body);
@@ -432,12 +435,8 @@ class ProbeResultsV100JobTest : public ProbeResultsJobTest {
 TEST_F(ProbeResultsV100JobTest, PlotStreamsWriteTheOlderRecords) {
   ASSERT_FALSE(read_.fault) << read_.fault->what;
   const std::vector<Record> r = EngineRecords();
-  const uint8_t kinds[] = {30, 39, 38, 52, 55, 33, 40, 40, 35, 41, 36, 36,
-                           36, 4,  4,  4,  4,  37, 37, 30, 55, 39, 4,  37};
-  std::vector<uint8_t> got;
-  for (const Record& rec : r)
-    got.push_back(rec.kind);
-  ASSERT_EQ(got, std::vector<uint8_t>(std::begin(kinds), std::end(kinds)));
+  ASSERT_EQ(Kinds(r), std::vector<uint8_t>({30, 39, 38, 52, 55, 33, 40, 40, 35, 41, 36, 36,
+                                            36, 4,  4,  4,  4,  37, 37, 30, 55, 39, 4,  37}));
   const PlotLine* lines[5] = {&kMainLines[0], &kMainLines[1], &kMainLines[2], &kMainLines[3],
                               &kThreadLine};
   const size_t at[5] = {13, 14, 15, 16, 22};

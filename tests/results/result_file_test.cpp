@@ -19,6 +19,17 @@ using test::ReadBytes;
 using test::SplitRecords;
 using test::TempPath;
 
+// The records of a file written by `write` between Open and Close.
+template <typename Write>
+std::vector<test::RawRecord> WrittenRecords(const char* name, Write write) {
+  const std::string path = TempPath(name);
+  TResultFile writer(path);
+  EXPECT_TRUE(writer.Open());
+  write(writer);
+  EXPECT_TRUE(writer.Close());
+  return SplitRecords(ReadBytes(path));
+}
+
 TEST(ResultFileFraming, EmptyFileIsHeaderAndEndRecord) {
   const std::string path = TempPath("empty.res");
   TResultFile writer(path);
@@ -31,14 +42,10 @@ TEST(ResultFileFraming, EmptyFileIsHeaderAndEndRecord) {
 }
 
 TEST(ResultFileFraming, MessagesAreCutAndNullIsEmpty) {
-  const std::string path = TempPath("msg.res");
-  TResultFile writer(path);
-  ASSERT_TRUE(writer.Open());
-  const std::string long_text(300, 'x');
-  EXPECT_TRUE(writer.WriteMessage(long_text.c_str(), 1));
-  EXPECT_TRUE(writer.WriteMessage(nullptr, 3));
-  ASSERT_TRUE(writer.Close());
-  const auto records = SplitRecords(ReadBytes(path));
+  const auto records = WrittenRecords("msg.res", [](TResultFile& writer) {
+    EXPECT_TRUE(writer.WriteMessage(std::string(300, 'x').c_str(), 1));
+    EXPECT_TRUE(writer.WriteMessage(nullptr, 3));
+  });
   ASSERT_EQ(records.size(), 4u);
   EXPECT_EQ(records[1].kind, kKindMessage);
   EXPECT_EQ(At<uint32_t>(records[1].payload, 0), 3u);
@@ -50,14 +57,11 @@ TEST(ResultFileFraming, MessagesAreCutAndNullIsEmpty) {
 }
 
 TEST(ResultFileFraming, MessageFlagsGiveTypesAndDepths) {
-  const std::string path = TempPath("depth.res");
-  TResultFile writer(path);
-  ASSERT_TRUE(writer.Open());
-  writer.WriteMessage("open", 0x10);
-  writer.WriteMessage("close", 0x20);
-  writer.WriteMessage("both", 0x30 | 0x400 | 9);
-  ASSERT_TRUE(writer.Close());
-  const auto records = SplitRecords(ReadBytes(path));
+  const auto records = WrittenRecords("depth.res", [](TResultFile& writer) {
+    writer.WriteMessage("open", 0x10);
+    writer.WriteMessage("close", 0x20);
+    writer.WriteMessage("both", 0x30 | 0x400 | 9);
+  });
   ASSERT_EQ(records.size(), 5u);
   EXPECT_EQ(At<uint32_t>(records[1].payload, 0), 0x20u);
   EXPECT_EQ(At<uint32_t>(records[1].payload, 4), 1u);
@@ -74,38 +78,32 @@ TEST(ResultFileFraming, MessageTypeTable) {
 }
 
 TEST(ResultFileFraming, RecordOver16377BytesIsRefused) {
-  const std::string path = TempPath("big.res");
-  TResultFile writer(path);
-  ASSERT_TRUE(writer.Open());
-  std::vector<uint8_t> payload(16378, 0xAB);
-  EXPECT_FALSE(writer.WriteRecord(30, payload.data(), payload.size()));
-  EXPECT_TRUE(writer.WriteRecord(30, payload.data(), 16377));
-  ASSERT_TRUE(writer.Close());
-  const auto records = SplitRecords(ReadBytes(path));
+  const auto records = WrittenRecords("big.res", [](TResultFile& writer) {
+    const std::vector<uint8_t> payload(16378, 0xAB);
+    EXPECT_FALSE(writer.WriteRecord(30, payload.data(), payload.size()));
+    EXPECT_TRUE(writer.WriteRecord(30, payload.data(), 16377));
+  });
   ASSERT_EQ(records.size(), 3u);
   EXPECT_EQ(records[1].payload.size(), 16377u);
 }
 
 TEST(ResultFileFraming, PlotDescriptionsAreEncoded) {
-  const std::string path = TempPath("plot.res");
-  TResultFile writer(path);
-  ASSERT_TRUE(writer.Open());
-  PlotLineDescEx ex{};
-  ex.stream_id = 1;
-  ex.flags = 0x101;
-  ex.sat_a = 5;
-  ex.sat_b = 12;
-  ex.index = 7;
-  std::strcpy(ex.name, "G05-G12 L1");
-  EXPECT_TRUE(writer.WriteRecord(kKindPlotLineV101, &ex, sizeof ex));
-  PlotLineDescIm im{};
-  im.index = 9;
-  im.value = 3;
-  std::memset(im.name, 'n', kPlotNameMax);  // no terminator inside the 80 bytes
-  EXPECT_TRUE(writer.WriteRecord(kKindPlotLineV100, &im, sizeof im));
-  EXPECT_FALSE(writer.WriteRecord(kKindPlotLineV101, &ex, 5));  // shorter than its fixed part
-  ASSERT_TRUE(writer.Close());
-  const auto records = SplitRecords(ReadBytes(path));
+  const auto records = WrittenRecords("plot.res", [](TResultFile& writer) {
+    PlotLineDescEx ex{};
+    ex.stream_id = 1;
+    ex.flags = 0x101;
+    ex.sat_a = 5;
+    ex.sat_b = 12;
+    ex.index = 7;
+    std::strcpy(ex.name, "G05-G12 L1");
+    EXPECT_TRUE(writer.WriteRecord(kKindPlotLineV101, &ex, sizeof ex));
+    PlotLineDescIm im{};
+    im.index = 9;
+    im.value = 3;
+    std::memset(im.name, 'n', kPlotNameMax);  // no terminator inside the 80 bytes
+    EXPECT_TRUE(writer.WriteRecord(kKindPlotLineV100, &im, sizeof im));
+    EXPECT_FALSE(writer.WriteRecord(kKindPlotLineV101, &ex, 5));  // shorter than its fixed part
+  });
   ASSERT_EQ(records.size(), 4u);
   const auto& p53 = records[1].payload;
   ASSERT_EQ(p53.size(), 11u + 10);
