@@ -7,7 +7,7 @@
 #include <sstream>
 #include <stdexcept>
 
-#include "support/scratch.h"
+#include "raw/scan.h"
 
 namespace vox::test {
 
@@ -67,6 +67,24 @@ ToolRun RunVoxraw(const std::vector<std::string>& args, const std::string& scrat
   fs::remove(out);
   fs::remove(err);
   return r;
+}
+
+Converted::Converted(const std::string& obs, const std::vector<std::string>& navs,
+                     const std::vector<std::string>& options) {
+  path = scratch.File("out.raw");
+  std::vector<std::string> args = {"from-rinex", obs};
+  args.insert(args.end(), navs.begin(), navs.end());
+  args.insert(args.end(), {"-o", path});
+  args.insert(args.end(), options.begin(), options.end());
+  run = RunVoxraw(args, scratch.path().string());
+  if (run.exit_code != 0) return;
+  file = std::make_unique<TChainItem>(1, path, false, false);
+  occupation = std::make_unique<TOccupItem>(1);
+  occupation->SetFile(file.get());
+  ScanSinks sinks;
+  sinks.ephemerides = &ephemerides;
+  sinks.log.write = [](void*, const char*) {};
+  status = ScanFile(*file, sinks);
 }
 
 double GpsSeconds(int y, int m, int d, int hour, int minute, double second) {

@@ -4,9 +4,14 @@
 #pragma once
 
 #include <array>
+#include <memory>
 #include <optional>
 #include <string>
 #include <vector>
+
+#include "job/items.h"
+#include "raw/ephemeris_store.h"
+#include "support/scratch.h"
 
 namespace vox::test {
 
@@ -27,6 +32,21 @@ struct ToolRun {
 };
 // Runs voxraw with the arguments (each quoted for the shell), capturing its output.
 ToolRun RunVoxraw(const std::vector<std::string>& args, const std::string& scratch);
+
+// A RINEX observation file (with navigation files and options) converted by voxraw
+// from-rinex, and scanned as data preparation would, with one occupation over it.
+struct Converted {
+  Converted(const std::string& obs, const std::vector<std::string>& navs,
+            const std::vector<std::string>& options = {});
+
+  ScratchDir scratch;
+  std::string path;
+  ToolRun run;
+  std::unique_ptr<TChainItem> file;
+  std::unique_ptr<TOccupItem> occupation;
+  EphemerisStore ephemerides;
+  int status = 0;
+};
 
 // ---- RINEX text, read plainly (version 2 and 3 observation files, version 2 GPS navigation)
 

@@ -2,7 +2,6 @@
 // back through the library's own scan, epoch stream and ephemeris store: every epoch, every
 // satellite and every value must arrive as the RINEX text states it, in both byte orders.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
 
 #include <cmath>
 #include <filesystem>
@@ -11,48 +10,16 @@
 #include <set>
 
 #include "base/sat.h"
-#include "job/items.h"
-#include "raw/ephemeris_store.h"
 #include "raw/epoch_stream.h"
 #include "raw/precise_store.h"
 #include "raw/scan.h"
 #include "realdata.h"
-#include "support/scratch.h"
 
 namespace vox::test {
 namespace {
 
 namespace fs = std::filesystem;
 constexpr double kC = 299792458.0;
-
-// A converted raw file, scanned as data preparation would, with one occupation over it.
-struct Converted {
-  ScratchDir scratch;
-  std::string path;
-  ToolRun run;
-  std::unique_ptr<TChainItem> file;
-  std::unique_ptr<TOccupItem> occupation;
-  EphemerisStore ephemerides;
-  int status = 0;
-
-  Converted(const std::string& obs, const std::vector<std::string>& navs,
-            const std::vector<std::string>& options = {}) {
-    path = scratch.File("out.raw");
-    std::vector<std::string> args = {"from-rinex", obs};
-    args.insert(args.end(), navs.begin(), navs.end());
-    args.insert(args.end(), {"-o", path});
-    args.insert(args.end(), options.begin(), options.end());
-    run = RunVoxraw(args, scratch.path().string());
-    if (run.exit_code != 0) return;
-    file = std::make_unique<TChainItem>(1, path, false, false);
-    occupation = std::make_unique<TOccupItem>(1);
-    occupation->SetFile(file.get());
-    ScanSinks sinks;
-    sinks.ephemerides = &ephemerides;
-    sinks.log.write = [](void*, const char*) {};
-    status = ScanFile(*file, sinks);
-  }
-};
 
 struct Station {
   const char* name;
@@ -63,7 +30,19 @@ void PrintTo(const Station& s, std::ostream* os) {
   *os << s.name;
 }
 
-class StationTest : public ::testing::TestWithParam<std::tuple<Station, bool>> {};
+class StationTest : public ::testing::TestWithParam<std::tuple<Station, bool>> {
+ protected:
+  std::string Path(const char* extension) const {
+    return GnssDir() + "/" + std::get<0>(GetParam()).name + extension;
+  }
+  // The station's observation and navigation files, converted in the case's byte order.
+  std::unique_ptr<Converted> Convert() const {
+    std::vector<std::string> options;
+    if (std::get<1>(GetParam())) options.push_back("--big-endian");
+    return std::make_unique<Converted>(Path(".05o"), std::vector<std::string>{Path(".05n")},
+                                       options);
+  }
+};
 
 // RINEX 2 types of these files and where the stream delivers them: value index 2s is the code
 // of slot s, 2s + 1 its phase.
@@ -71,17 +50,14 @@ const std::map<std::string, int> kValueOfType = {{"C1", 0}, {"L1", 1}, {"P2", 6}
 
 TEST_P(StationTest, EveryEpochSatelliteAndValueReachesTheEpochStream) {
   REQUIRE_GNSS_DATA();
-  const auto [station, big_endian] = GetParam();
-  const std::string obs = GnssDir() + "/" + station.name + ".05o";
-  std::vector<std::string> options;
-  if (big_endian) options.push_back("--big-endian");
-  Converted c(obs, {GnssDir() + "/" + station.name + ".05n"}, options);
+  const std::unique_ptr<Converted> converted = Convert();
+  const Converted& c = *converted;
   ASSERT_EQ(c.run.exit_code, 0) << c.run.err;
   ASSERT_EQ(c.status, kScanComplete);
-  EXPECT_EQ(c.file->receiver_text, station.receiver);
+  EXPECT_EQ(c.file->receiver_text, std::get<0>(GetParam()).receiver);
   EXPECT_EQ(c.file->epoch_interval_ms, 30000u);
 
-  const TextObs text = ReadTextObs(obs);
+  const TextObs text = ReadTextObs(Path(".05o"));
   ASSERT_EQ(c.file->epoch_count, text.epochs.size());
   auto stream = EpochStream::Open(*c.occupation, 0, nullptr, nullptr);
   ASSERT_TRUE(stream);
@@ -120,17 +96,14 @@ TEST_P(StationTest, EveryEpochSatelliteAndValueReachesTheEpochStream) {
 
 TEST_P(StationTest, BroadcastEphemeridesReachTheStoreInOurFieldConvention) {
   REQUIRE_GNSS_DATA();
-  const auto [station, big_endian] = GetParam();
-  const std::string nav = GnssDir() + "/" + station.name + ".05n";
-  std::vector<std::string> options;
-  if (big_endian) options.push_back("--big-endian");
-  Converted c(GnssDir() + "/" + station.name + ".05o", {nav}, options);
+  const std::unique_ptr<Converted> converted = Convert();
+  const Converted& c = *converted;
   ASSERT_EQ(c.run.exit_code, 0) << c.run.err;
 
   // The first record of each satellite and toe wins, in the store as in the file's order.
   std::set<std::pair<int, uint32_t>> seen;
   size_t checked = 0;
-  for (const TextNav& r : ReadTextNavV2(nav)) {
+  for (const TextNav& r : ReadTextNavV2(Path(".05n"))) {
     const uint32_t week = static_cast<uint32_t>(r.v[21]);
     const uint32_t time = week * 604800u + static_cast<uint32_t>(r.v[11]);
     if (!seen.insert({r.prn, time}).second) continue;

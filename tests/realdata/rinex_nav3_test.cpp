@@ -6,14 +6,10 @@
 
 #include <cmath>
 #include <cstdio>
-#include <fstream>
 
 #include "base/sat.h"
-#include "job/items.h"
-#include "raw/ephemeris_store.h"
 #include "raw/scan.h"
 #include "realdata.h"
-#include "support/scratch.h"
 
 namespace vox::test {
 namespace {
@@ -75,21 +71,13 @@ TEST_P(Nav3Records, EverySystemReachesTheStoreOnGpsTime) {
   nav += Record("I05", "2016 06 18 02 00 00", Kepler(toe, 6493.0, 1, 0.0));
   const std::string nav_path = WriteFile(scratch.File("mixed.16p"), nav);
 
-  const std::string out = scratch.File("out.raw");
-  const ToolRun run =
-      RunVoxraw({"from-rinex", GnssDir() + "/multignss/UCAL00CAN_S_20161700100_15M_01S_MO",
-                 nav_path, "-o", out},
-                scratch.path().string());
-  ASSERT_EQ(run.exit_code, 0) << run.err;
-  EXPECT_NE(run.out.find("6 ephemerides"), std::string::npos) << run.out;
-  EXPECT_NE(run.out.find("1 ephemerides of satellites or systems"), std::string::npos) << run.out;
-
-  TChainItem file(1, out, false, false);
-  EphemerisStore store;
-  ScanSinks sinks;
-  sinks.ephemerides = &store;
-  sinks.log.write = [](void*, const char*) {};
-  ASSERT_EQ(ScanFile(file, sinks), kScanComplete);
+  Converted conv(GnssDir() + "/multignss/UCAL00CAN_S_20161700100_15M_01S_MO", {nav_path});
+  ASSERT_EQ(conv.run.exit_code, 0) << conv.run.err;
+  EXPECT_NE(conv.run.out.find("6 ephemerides"), std::string::npos) << conv.run.out;
+  EXPECT_NE(conv.run.out.find("1 ephemerides of satellites or systems"), std::string::npos)
+      << conv.run.out;
+  ASSERT_EQ(conv.status, kScanComplete);
+  const EphemerisStore& store = conv.ephemerides;
   ASSERT_EQ(store.Total(), 6u);
   auto head = [&](SatSystem s, unsigned n) {
     const TNavEphemItem* item = store.head(SatIndexOf(MakeSatId(s, n)));
