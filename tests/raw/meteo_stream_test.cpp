@@ -2,9 +2,7 @@
 #include <gtest/gtest.h>
 
 #include "raw/meteo_stream.h"
-#include "raw/scan.h"
-#include "raw_test_files.h"
-#include "raw_writer.h"
+#include "scan_test_util.h"
 
 namespace vox::test {
 namespace {
@@ -26,14 +24,13 @@ struct Sample {
   float temperature = 20.0f;
 };
 
-// Scans a file with the given meteorological records into tracks.
-class MeteoFile {
- public:
+// Scans a file with the given meteorological records (and a position without height).
+struct MeteoFile : ScanRun {
   MeteoFile(RawOrder order, const std::vector<Sample>& samples,
-            std::optional<std::vector<double>> xyz = {}, std::optional<double> height = {}) {
+            std::optional<std::vector<double>> xyz = {}) {
     RawWriter w(order);
     w.Header().TimeRef("GPS", {0, kDay});
-    if (xyz || height) w.MeteoPosition(1, xyz, height);
+    if (xyz) w.MeteoPosition(1, xyz, {});
     for (const Sample& s : samples) {
       RawMeteoSample m;
       m.time = {s.second * 1000 + s.ms, kDay};
@@ -42,19 +39,9 @@ class MeteoFile {
       w.MeteoSample(m);
     }
     w.EndOfData();
-    TempRawFile raw(w);
-    TChainItem file(3, raw.path(), false, false);
-    ScanSinks sinks;
-    sinks.meteo = &tracks;
-    sinks.log.write = [](void*, const char*) {};
-    status = ScanFile(file, sinks);
-    file_id = file.id;
+    Run(w);
   }
-  std::unique_ptr<MeteoCursor> Open() { return OpenMeteoCursor(tracks, file_id); }
-
-  MeteoTrackList tracks;
-  uint32_t file_id = 0;
-  int status = 0;
+  std::unique_ptr<MeteoCursor> Open() { return OpenMeteoCursor(meteo, file->id); }
 };
 
 vox_MeteoData Query(MeteoCursor& c, const TimeMs& t) {
@@ -68,7 +55,7 @@ class MeteoStreamTest : public ::testing::TestWithParam<RawOrder> {};
 TEST_P(MeteoStreamTest, FileWithoutMeteoRecordsHasNoStream) {
   MeteoFile f(GetParam(), {});
   ASSERT_EQ(f.status, kScanComplete);
-  EXPECT_TRUE(f.tracks.empty());
+  EXPECT_TRUE(f.meteo.empty());
   EXPECT_FALSE(f.Open());
 }
 
@@ -124,8 +111,8 @@ TEST_P(MeteoStreamTest, HeightComesFromAPositionWithoutHeight) {
   MeteoFile f(GetParam(), {{10, 0, 1000.0f}}, std::vector<double>{6378137.0 + 250.0, 0.0, 0.0});
   auto c = f.Open();
   EXPECT_FLOAT_EQ(Query(*c, At(10)).height, 250.0f);
-  ASSERT_FALSE(f.tracks.empty());
-  EXPECT_TRUE(f.tracks.head()->positions[0].flags & (1u << 7));
+  ASSERT_FALSE(f.meteo.empty());
+  EXPECT_TRUE(f.meteo.head()->positions[0].flags & (1u << 7));
 }
 
 INSTANTIATE_TEST_SUITE_P(Orders, MeteoStreamTest,
