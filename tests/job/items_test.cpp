@@ -26,22 +26,6 @@ TEST(Items, ReferencesAreSetOnceAndListedWithTheirTarget) {
   EXPECT_EQ(point.occupations.Count(), 1u);
 }
 
-TEST(Items, PointCopyTakesANewIdentityAndNoOccupations) {
-  TPointItem point(2);
-  point.name = "P2";
-  point.type = 2;
-  point.solved_set = true;
-  TOccupItem occupation(1);
-  occupation.SetPoint(&point);
-  const TPointItem copy(4, point);
-  EXPECT_EQ(copy.id, 0x01000004u);
-  EXPECT_EQ(copy.base_id, 0x01000004u);
-  EXPECT_EQ(copy.name, "P2");
-  EXPECT_EQ(copy.type, 2);
-  EXPECT_TRUE(copy.solved_set);
-  EXPECT_TRUE(copy.occupations.empty());
-}
-
 TEST(Items, ParamBlockCopiesWhatItsHeaderSays) {
   auto block = ParamBlock::Create(12);
   EXPECT_EQ(block->data()[0] | block->data()[1] << 8, 0);

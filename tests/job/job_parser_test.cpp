@@ -283,7 +283,7 @@ TEST_F(JobParserTest, PointsWithoutSectionsAreStillMade) {
 
 constexpr const char* kReoccupiedJob =
     "NumPoints=3\nNumOccups=3\nNumFiles=1\n[FILE:1]\nName=a.raw\n[POINT:2]\nName=P2\n"
-    "PosX=10\n[OCCUP:1]\nPoint=2\nFile=1\n[OCCUP:2]\nPoint=2\nFile=1\n[OCCUP:3]\nPoint=1\n";
+    "PosX=10\nType=0\n[OCCUP:1]\nPoint=2\nFile=1\n[OCCUP:2]\nPoint=2\nFile=1\n[OCCUP:3]\nPoint=1\n";
 
 TEST_F(JobParserTest, ReoccupiedPointsGetCopiesUnlessReoccupationsAreOn) {
   ASSERT_TRUE(Parse(std::string("[JOB]\n") + kReoccupiedJob));
@@ -293,6 +293,7 @@ TEST_F(JobParserTest, ReoccupiedPointsGetCopiesUnlessReoccupationsAreOn) {
   EXPECT_EQ(copy->base_id, 0x01000004u);
   EXPECT_EQ(copy->name, "P2");
   EXPECT_EQ(copy->x, 10.0);
+  EXPECT_EQ(copy->type, 0);
   EXPECT_EQ(copy->occupations.Count(), 1u);
   EXPECT_EQ(model.FindPoint(2)->occupations.Count(), 1u);
   EXPECT_EQ(model.FindOccup(3)->point, model.FindPoint(1));
