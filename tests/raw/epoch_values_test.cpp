@@ -1,5 +1,5 @@
-// Code values on one time scale, the GPS L2C rules, leap seconds and the NMEA output of the
-// epoch stream, in both byte orders.
+// Leap seconds, the GPS L2C rules, the NMEA output and damaged input of the epoch stream, in
+// both byte orders.
 #include <gtest/gtest.h>
 
 #include <filesystem>
@@ -15,36 +15,8 @@ namespace {
 
 class EpochValuesTest : public ::testing::TestWithParam<RawOrder> {};
 
-struct ScaleCase {
-  uint8_t tag;
-  char system;
-  unsigned number;
-  const char* time_system;
-  double offset;  // added to pseudorange / c; L = 17
-};
-
-TEST_P(EpochValuesTest, CodeValuesComeOnOneTimeScale) {
-  const double L = 17.0;
-  const ScaleCase cases[] = {
-      {51, 'G', 3, "GPS", 0.0},      {51, 'G', 3, "UTC", -L},   {51, 'E', 3, "GPS", 0.0},
-      {51, 'E', 3, "UTC", -L},       {51, 'S', 33, "GPS", 0.0}, {51, 'S', 33, "UTC", -L},
-      {51, 'R', 3, "GPS", +L},       {51, 'R', 3, "UTC", 0.0},  {51, 'C', 3, "GPS", 14.0},
-      {51, 'C', 3, "UTC", 14.0 - L}, {8, 'G', 3, "GPS", 0.0},   {8, 'G', 3, "UTC", -L},
-      {8, 'R', 3, "GPS", +L},        {8, 'R', 3, "UTC", 0.0},   {8, 'S', 33, "GPS", +L},
-      {8, 'S', 33, "UTC", 0.0},
-  };
-  for (const ScaleCase& c : cases) {
-    const double pr = 2.0e7 + 0.123;
-    ScannedFile f(BuildFile(GetParam(), {{1000, {Sat(c.tag, c.system, c.number, {{0, pr, {}}})}}},
-                            c.time_system, {}, c.tag));
-    auto s = f.Open();
-    ASSERT_TRUE(s);
-    EXPECT_EQ(s->time_reference().leap_seconds, 17u);
-    const auto d = FirstSatellite(*s);
-    ASSERT_TRUE(d) << c.system << int(c.tag) << c.time_system;
-    EXPECT_EQ(d->values[0], pr / kC + c.offset) << c.system << int(c.tag) << c.time_system;
-  }
-}
+// Code values of every system on one time scale, in GPS-time and UTC-based files of both
+// epoch record kinds, are checked value for value by the probe job test (probe_epoch_job_test).
 
 TEST_P(EpochValuesTest, LeapSecondsOfTheRecordAreReportedToTheTable) {
   // A day in March 2020, which the built-in table does not cover.
