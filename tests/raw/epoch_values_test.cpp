@@ -13,7 +13,14 @@
 namespace vox::test {
 namespace {
 
-class EpochValuesTest : public ::testing::TestWithParam<RawOrder> {};
+// Some cases register a file's leap seconds with the process-wide table; each case starts
+// and leaves with the table empty, so that no other test (they share one process on Windows)
+// sees the rows it added.
+class EpochValuesTest : public ::testing::TestWithParam<RawOrder> {
+ protected:
+  void SetUp() override { ResetLeapTableForTesting(); }
+  void TearDown() override { ResetLeapTableForTesting(); }
+};
 
 // Code values of every system on one time scale, in GPS-time and UTC-based files of both
 // epoch record kinds, are checked value for value by the probe job test (probe_epoch_job_test).
