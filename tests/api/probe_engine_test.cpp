@@ -18,14 +18,6 @@
 namespace vox {
 namespace {
 
-std::vector<std::string> Lines(const std::string& text) {
-  std::vector<std::string> lines;
-  std::istringstream in(text);
-  for (std::string line; std::getline(in, line);)
-    lines.push_back(line);
-  return lines;
-}
-
 class ProbeEngineTest : public ::testing::Test {
  protected:
   void TearDown() override {
@@ -73,7 +65,7 @@ class ProbeEngineTest : public ::testing::Test {
     engine->ProcessGroup(&context);
     task_.current_engine = nullptr;
     task_.result_file.Close();
-    return Lines(test::ReadFile(out_));
+    return test::FileLines(out_);
   }
 
   bool Has(const std::vector<std::string>& lines, const std::string& line) {

@@ -3,13 +3,12 @@
 // "kra_static.eng" from the library's own folder (not from the current folder), hands it the
 // parameters of [JOB] and ends with exit code 0.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
 #include <filesystem>
 #include <string>
 
 #include "raw_writer.h"
+#include "support/process.h"
 #include "support/scratch.h"
 
 namespace {
@@ -41,17 +40,8 @@ bool WriteRawFile(const std::string& path) {
 // "beside the library") is the copy there. Returns the exit status.
 int RunVoxrun(const std::string& library_folder, const std::string& job,
               const std::string& record) {
-  const pid_t pid = fork();
-  if (pid == 0) {
-    setenv("LD_LIBRARY_PATH", library_folder.c_str(), 1);
-    setenv("VOX_TEST_RECORD", record.c_str(), 1);
-    if (freopen("/dev/null", "w", stdout) == nullptr) _exit(126);
-    execl(VOX_VOXRUN, "voxrun", "--quiet", job.c_str(), static_cast<char*>(nullptr));
-    _exit(127);
-  }
-  int status = 0;
-  waitpid(pid, &status, 0);
-  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
+  return vox::test::RunProgram(VOX_VOXRUN, {"--quiet", job},
+                               {{"LD_LIBRARY_PATH", library_folder}, {"VOX_TEST_RECORD", record}});
 }
 
 TEST(ExampleJob, LoadsTheDefaultEngineBesideTheLibraryAndHandsItItsParameters) {

@@ -62,14 +62,6 @@ Results Read(const std::string& path) {
   return r;
 }
 
-std::vector<std::string> Lines(const std::string& path) {
-  std::vector<std::string> lines;
-  std::ifstream in(path);
-  for (std::string line; std::getline(in, line);)
-    lines.push_back(line);
-  return lines;
-}
-
 double Length(const double (&v)[3]) {
   return std::sqrt(v[0] * v[0] + v[1] * v[1] + v[2] * v[2]);
 }
@@ -198,7 +190,7 @@ TEST_F(ReferenceEngines, RawFilterFindsEveryStationWithinMetresAndWritesItsOutpu
   EXPECT_GT(track->sx + track->sy + track->sz, 10.0f);
 
   // One fix per epoch in the occupation that asked for NMEA, and none for the others.
-  const auto gga = Lines(folder_ + "/base.gga");
+  const auto gga = test::FileLines(folder_ + "/base.gga");
   ASSERT_EQ(gga.size(), survey_.EpochCount() + 1);
   EXPECT_EQ(gga[0].rfind("$GPZDA", 0), 0u);
   EXPECT_EQ(gga[1].rfind("$GPGGA", 0), 0u);
@@ -279,7 +271,7 @@ TEST_F(ReferenceEngines, KinematicRaysFollowTheTrack) {
   EXPECT_EQ(fixed, r.rays.size()) << "rms " << std::sqrt(sum2 / r.rays.size());
   EXPECT_LT(std::sqrt(sum2 / r.rays.size()), 0.05);
   // One GGA line per ray, with the fixed quality.
-  const auto gga = Lines(folder_ + "/fan.gga");
+  const auto gga = test::FileLines(folder_ + "/fan.gga");
   ASSERT_EQ(gga.size(), r.rays.size() + 1);
   EXPECT_NE(gga[1].find(",4,"), std::string::npos);
 }

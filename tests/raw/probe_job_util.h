@@ -2,9 +2,6 @@
 // processing engine: running voxrun, and reading the probe's report.
 #pragma once
 
-#include <sys/wait.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
@@ -12,32 +9,12 @@
 #include <string>
 #include <vector>
 
+#include "support/process.h"
 #include "support/scratch.h"
 
 namespace vox::test {
 
 #define PROBE_ENGINE_DIR VOX_TEST_ENGINE_DIR "/"
-
-// Runs voxrun on the job file (its output discarded); its exit status is the job's exit code.
-inline int RunVoxrun(const std::string& job) {
-  const pid_t pid = fork();
-  if (pid == 0) {
-    if (freopen("/dev/null", "w", stdout) == nullptr) _exit(126);
-    execl(VOX_VOXRUN, "voxrun", job.c_str(), static_cast<char*>(nullptr));
-    _exit(127);
-  }
-  int status = 0;
-  waitpid(pid, &status, 0);
-  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-}
-
-inline std::vector<std::string> Lines(const std::string& text) {
-  std::vector<std::string> lines;
-  std::istringstream in(text);
-  for (std::string line; std::getline(in, line);)
-    lines.push_back(line);
-  return lines;
-}
 
 // The lines that start with prefix.
 inline std::vector<std::string> WithPrefix(const std::vector<std::string>& lines,

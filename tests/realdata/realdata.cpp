@@ -37,17 +37,6 @@ std::string Quote(const std::string& s) {
 
 }  // namespace
 
-std::vector<std::string> Lines(const std::string& path) {
-  std::vector<std::string> lines;
-  std::istringstream in(ReadFile(path));
-  std::string line;
-  while (std::getline(in, line)) {
-    if (!line.empty() && line.back() == '\r') line.pop_back();
-    lines.push_back(line);
-  }
-  return lines;
-}
-
 std::string GnssDir() {
   const std::string dir = std::string(VOX_SHARED_DIR) + "/data/gnss";
   return fs::exists(dir + "/07590920.05o") ? dir : std::string();
@@ -111,7 +100,7 @@ const std::vector<std::string>& TextObs::TypesOf(char system) const {
 }
 
 TextObs ReadTextObs(const std::string& path, size_t max_epochs) {
-  const std::vector<std::string> lines = Lines(path);
+  const std::vector<std::string> lines = FileLines(path);
   TextObs obs;
   const bool v3 = Num(Cut(lines.at(0), 0, 9)) >= 3.0;
   size_t i = 1;
@@ -195,7 +184,7 @@ TextObs ReadTextObs(const std::string& path, size_t max_epochs) {
 }
 
 std::vector<TextNav> ReadTextNavV2(const std::string& path) {
-  const std::vector<std::string> lines = Lines(path);
+  const std::vector<std::string> lines = FileLines(path);
   size_t i = 0;
   while (i < lines.size() && Cut(lines[i], 60, 13) != "END OF HEADER")
     ++i;
@@ -225,7 +214,7 @@ std::vector<TextNav> ReadTextNavV2(const std::string& path) {
 std::vector<TextSp3Sample> ReadTextSp3(const std::string& path) {
   std::vector<TextSp3Sample> out;
   TextSp3Sample epoch{};
-  for (const std::string& l : Lines(path)) {
+  for (const std::string& l : FileLines(path)) {
     if (l.rfind("* ", 0) == 0) {
       epoch.year = std::atoi(Cut(l, 3, 4).c_str());
       epoch.month = std::atoi(Cut(l, 8, 2).c_str());

@@ -23,9 +23,6 @@ std::string GnssDir();
       GTEST_SKIP() << "the real GNSS data (" VOX_SHARED_DIR "/data/gnss) is not present"; \
   } while (0)
 
-// The lines of a text file, without their line ends (LF or CR LF).
-std::vector<std::string> Lines(const std::string& path);
-
 struct ToolRun {
   int exit_code = -1;
   std::string out, err;

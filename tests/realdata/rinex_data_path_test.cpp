@@ -231,7 +231,7 @@ class MalformedRinex : public ::testing::Test {
  protected:
   void SetUp() override {
     if (GnssDir().empty()) GTEST_SKIP() << "the real GNSS data is not present";
-    lines_ = Lines(GnssDir() + "/07590920.05o");
+    lines_ = FileLines(GnssDir() + "/07590920.05o");
   }
   std::string Write(const std::vector<std::string>& lines, const std::string& name = "bad.05o") {
     const std::string path = scratch_.File(name);
@@ -291,7 +291,7 @@ TEST_F(MalformedRinex, FailureKeepsAnEarlierFileUnderTheOutputName) {
 }
 
 TEST_F(MalformedRinex, DamagedNavigationRecordNamesTheNavigationFile) {
-  std::vector<std::string> nav = Lines(GnssDir() + "/07590920.05n");
+  std::vector<std::string> nav = FileLines(GnssDir() + "/07590920.05n");
   nav[14].replace(10, 5, "#####");  // an orbit line of the first record
   const std::string err = Fail(GnssDir() + "/07590920.05o", {Write(nav, "bad.05n")});
   EXPECT_NE(err.find("bad.05n:15:"), std::string::npos) << err;

@@ -18,6 +18,7 @@
 #include "probe_values.h"
 #include "raw_writer.h"
 #include "result_reader.h"
+#include "support/process.h"
 #include "support/scratch.h"
 
 namespace vox::test {
@@ -27,38 +28,6 @@ using namespace probe_values;
 using tools::Record;
 
 #define ENGINE_DIR VOX_TEST_ENGINE_DIR "/"
-
-std::vector<std::string> Lines(const std::string& text) {
-  std::vector<std::string> lines;
-  std::istringstream in(text);
-  for (std::string line; std::getline(in, line);)
-    lines.push_back(line);
-  return lines;
-}
-
-int RunVoxrun(const std::string& job) {
-  const pid_t pid = fork();
-  if (pid == 0) {
-    if (freopen("/dev/null", "w", stdout) == nullptr) _exit(126);
-    execl(VOX_VOXRUN, "voxrun", job.c_str(), static_cast<char*>(nullptr));
-    _exit(127);
-  }
-  int status = 0;
-  waitpid(pid, &status, 0);
-  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
-}
-
-std::string RunCommand(const std::string& command, int& status) {
-  std::string out;
-  FILE* pipe = popen(command.c_str(), "r");
-  if (pipe == nullptr) return out;
-  char buffer[4096];
-  size_t n;
-  while ((n = fread(buffer, 1, sizeof buffer, pipe)) > 0)
-    out.append(buffer, n);
-  status = pclose(pipe);
-  return out;
-}
 
 bool WriteRawFile(const std::string& path) {
   voxtools::RawWriter w;

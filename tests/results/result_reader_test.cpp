@@ -13,6 +13,9 @@
 #include "results/plot_stream.h"
 #include "results/result_file.h"
 #include "results/result_functions.h"
+#ifndef _WIN32
+#include "support/process.h"
+#endif
 
 namespace vox {
 namespace {
@@ -126,17 +129,7 @@ TEST(ResultReader, ReportsWhereAFileIsCutOrCorrupt) {
 // voxdump's own runs read its exit status through a POSIX pipe (the Windows build checks
 // voxdump.exe in its whole-job script).
 #if defined(VOXDUMP_PATH) && !defined(_WIN32)
-std::string RunCommand(const std::string& command, int& status) {
-  std::string out;
-  FILE* pipe = popen(command.c_str(), "r");
-  if (pipe == nullptr) return out;
-  char buffer[4096];
-  size_t n;
-  while ((n = fread(buffer, 1, sizeof buffer, pipe)) > 0)
-    out.append(buffer, n);
-  status = pclose(pipe);
-  return out;
-}
+using test::RunCommand;
 
 TEST(Voxdump, PrintsEverythingBeforeATruncatedLastRecordAndTheFault) {
   const auto bytes = test::ReadBytes(WriteSampleFile());

@@ -37,14 +37,6 @@ std::vector<std::string> Summary(const std::string& result_path) {
   return out;
 }
 
-std::vector<std::string> Lines(const std::string& text) {
-  std::vector<std::string> lines;
-  std::istringstream in(text);
-  for (std::string line; std::getline(in, line);)
-    lines.push_back(line);
-  return lines;
-}
-
 class EngineStepsTest : public ::testing::Test {
  protected:
   void SetUp() override {
@@ -88,7 +80,7 @@ class EngineStepsTest : public ::testing::Test {
     return Summary(result_);
   }
 
-  std::vector<std::string> Calls() { return Lines(test::ReadFile(record_)); }
+  std::vector<std::string> Calls() { return test::FileLines(record_); }
 
   // The calls whose line starts with prefix.
   std::vector<std::string> CallsOf(const std::string& prefix) {

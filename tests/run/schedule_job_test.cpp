@@ -3,8 +3,6 @@
 // workers, and the probe engine (tests/engines/probe_engine.cpp) is the static processing
 // engine, whose report of what it read is compared with the job.
 #include <gtest/gtest.h>
-#include <sys/wait.h>
-#include <unistd.h>
 
 #include <algorithm>
 #include <cstdlib>
@@ -14,6 +12,7 @@
 #include <vector>
 
 #include "raw_writer.h"
+#include "support/process.h"
 #include "support/scratch.h"
 
 namespace vox::test {
@@ -26,14 +25,6 @@ using voxtools::RawWriter;
 #define ENGINE_DIR VOX_TEST_ENGINE_DIR "/"
 constexpr uint32_t kDay = 13204;
 
-std::vector<std::string> Lines(const std::string& text) {
-  std::vector<std::string> lines;
-  std::istringstream in(text);
-  for (std::string line; std::getline(in, line);)
-    lines.push_back(line);
-  return lines;
-}
-
 size_t CountPrefix(const std::vector<std::string>& lines, const std::string& prefix) {
   return std::count_if(lines.begin(), lines.end(),
                        [&](const std::string& l) { return l.rfind(prefix, 0) == 0; });
@@ -41,19 +32,6 @@ size_t CountPrefix(const std::vector<std::string>& lines, const std::string& pre
 
 uint32_t U32At(const std::vector<uint8_t>& b, size_t at) {
   return b[at] | b[at + 1] << 8 | b[at + 2] << 16 | static_cast<uint32_t>(b[at + 3]) << 24;
-}
-
-// Runs voxrun on the job file (its output discarded); its exit status is the job's exit code.
-int RunVoxrun(const std::string& job) {
-  const pid_t pid = fork();
-  if (pid == 0) {
-    if (freopen("/dev/null", "w", stdout) == nullptr) _exit(126);
-    execl(VOX_VOXRUN, "voxrun", job.c_str(), static_cast<char*>(nullptr));
-    _exit(127);
-  }
-  int status = 0;
-  waitpid(pid, &status, 0);
-  return WIFEXITED(status) ? WEXITSTATUS(status) : -1;
 }
 
 // A raw file of `epochs` one-second epochs of two GPS satellites, starting at first_s.

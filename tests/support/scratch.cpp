@@ -71,6 +71,20 @@ std::string ReadFile(const std::string& path) {
   return text.str();
 }
 
+std::vector<std::string> Lines(const std::string& text) {
+  std::vector<std::string> lines;
+  std::istringstream in(text);
+  for (std::string line; std::getline(in, line);) {
+    if (!line.empty() && line.back() == '\r') line.pop_back();
+    lines.push_back(line);
+  }
+  return lines;
+}
+
+std::vector<std::string> FileLines(const std::string& path) {
+  return Lines(ReadFile(path));
+}
+
 std::string JobText(const std::string& name, const std::string& result_path,
                     const std::string& extra_lines) {
   return "[JOB]\nName=" + name + "\nResultPath=" + result_path + "\n" + extra_lines;

@@ -33,6 +33,10 @@ class ScratchDir {
 // Writes text to path exactly as given (no line-end conversion); returns path.
 std::string WriteFile(const std::string& path, const std::string& text);
 std::string ReadFile(const std::string& path);
+// The lines of a text without their line ends (a CR before a line feed goes too).
+std::vector<std::string> Lines(const std::string& text);
+// The lines of the file at path (none when it cannot be read).
+std::vector<std::string> FileLines(const std::string& path);
 
 // A job file with one [JOB] section: Name, ResultPath and any extra lines ("Key=Value\n"...).
 std::string JobText(const std::string& name, const std::string& result_path,
