@@ -13,13 +13,12 @@
 
 #include <atomic>
 #include <chrono>
-#include <condition_variable>
 #include <filesystem>
-#include <mutex>
 #include <string>
 #include <thread>
 #include <vector>
 
+#include "support/host_recorder.h"
 #include "support/scratch.h"
 #include "vox/vox_host.h"
 
@@ -28,29 +27,13 @@ namespace {
 namespace fs = std::filesystem;
 using namespace std::chrono_literals;
 
-struct Recorder {
-  std::mutex mutex;
-  std::condition_variable changed;
-  std::vector<uint32_t> exit_codes;
-};
-Recorder g_recorder;
-
-void VOX_CALL RecordCallback(void* context, uint32_t code, uint32_t value) {
-  auto* r = static_cast<Recorder*>(context);
-  std::lock_guard lock(r->mutex);
-  if (code == VOX_CALLBACK_EXIT_CODE) r->exit_codes.push_back(value);
-  r->changed.notify_all();
-}
-vox_HostCallbackPair g_pair{RecordCallback, &g_recorder};
+vox::test::HostRecorder& g_recorder = vox::test::HostRecorder::Instance();
 
 constexpr const char* kEngine = VOX_TEST_ENGINE_DIR "/test_fault.eng";
 
 class JobFaultTest : public ::testing::Test {
  protected:
-  void SetUp() override {
-    std::lock_guard lock(g_recorder.mutex);
-    g_recorder.exit_codes.clear();
-  }
+  void SetUp() override { g_recorder.Clear(); }
 
   // A static job on the fault engine (also its raw filter) with the given [JOB] lines.
   std::string WriteJob(const std::string& engine_lines) {
@@ -62,11 +45,7 @@ class JobFaultTest : public ::testing::Test {
   }
 
   uint32_t WaitForEnd(vox_ControlHandle h, std::chrono::seconds limit = 30s) {
-    SendEngineControl(h, VOX_CMD_SET_CALLBACK, reinterpret_cast<uintptr_t>(&g_pair));
-    std::unique_lock lock(g_recorder.mutex);
-    const bool ended =
-        g_recorder.changed.wait_for(lock, limit, [] { return !g_recorder.exit_codes.empty(); });
-    return ended ? g_recorder.exit_codes.front() : 0xFFFFFFFFu;
+    return g_recorder.WaitForEnd(h, limit);
   }
 
   bool EngineEntered() const { return fs::exists(record_); }

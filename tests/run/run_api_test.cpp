@@ -6,12 +6,12 @@
 #include <unistd.h>
 
 #include <chrono>
-#include <condition_variable>
 #include <csignal>
 #include <mutex>
 #include <thread>
 #include <vector>
 
+#include "support/host_recorder.h"
 #include "support/scratch.h"
 #include "vox/vox_host.h"
 
@@ -19,42 +19,17 @@ extern "C" uint32_t PingFromC(vox_ControlHandle handle);
 
 namespace {
 
-// Everything the host callback has been told. One callback serves the whole process: the
-// first registration stays in force.
-struct Recorder {
-  std::mutex mutex;
-  std::condition_variable changed;
-  std::vector<uint32_t> exit_codes;
-  std::vector<uint32_t> progress;
-};
-Recorder g_recorder;
-
-void VOX_CALL Record(void* context, uint32_t code, uint32_t value) {
-  auto* r = static_cast<Recorder*>(context);
-  std::lock_guard lock(r->mutex);
-  if (code == VOX_CALLBACK_EXIT_CODE) r->exit_codes.push_back(value);
-  if (code == VOX_CALLBACK_PROGRESS) r->progress.push_back(value);
-  r->changed.notify_all();
-}
-
-vox_HostCallbackPair g_pair{Record, &g_recorder};
+vox::test::HostRecorder& g_recorder = vox::test::HostRecorder::Instance();
+vox_HostCallbackPair& g_pair = g_recorder.pair;
 
 class RunApiTest : public ::testing::Test {
  protected:
-  void SetUp() override {
-    std::lock_guard lock(g_recorder.mutex);
-    g_recorder.exit_codes.clear();
-    g_recorder.progress.clear();
-  }
+  void SetUp() override { g_recorder.Clear(); }
 
   // Registers the recorder on h (it stays registered for good after the first time) and
   // waits for the job's exit code.
   uint32_t WaitForEnd(vox_ControlHandle h) {
-    SendEngineControl(h, VOX_CMD_SET_CALLBACK, reinterpret_cast<uintptr_t>(&g_pair));
-    std::unique_lock lock(g_recorder.mutex);
-    const bool ended = g_recorder.changed.wait_for(lock, std::chrono::seconds(20),
-                                                   [] { return !g_recorder.exit_codes.empty(); });
-    return ended ? g_recorder.exit_codes.front() : 0xFFFFFFFFu;
+    return g_recorder.WaitForEnd(h, std::chrono::seconds(20));
   }
 
   uint32_t RunJob(const std::string& path) { return WaitForEnd(RunProcess(path.c_str())); }
