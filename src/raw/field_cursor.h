@@ -40,9 +40,7 @@ struct BigEndianOrder {
 
 using ByteSpan = std::span<const uint8_t>;
 
-// kChecked = false drops the per-field bounds tests; callers use it only after making sure the
-// span holds the largest size the decoded item can take.
-template <typename Order, bool kChecked = true>
+template <typename Order>
 class FieldCursor {
  public:
   explicit FieldCursor(ByteSpan bytes)
@@ -50,7 +48,7 @@ class FieldCursor {
 
   template <typename T>
   T Get() {
-    if (kChecked && static_cast<size_t>(end_ - p_) < sizeof(T)) {
+    if (static_cast<size_t>(end_ - p_) < sizeof(T)) {
       p_ = end_;
       overrun_ = true;
       return T{};
@@ -95,7 +93,7 @@ class FieldCursor {
   }
 
   void Skip(size_t n) {
-    if (kChecked && static_cast<size_t>(end_ - p_) < n) {
+    if (static_cast<size_t>(end_ - p_) < n) {
       p_ = end_;
       overrun_ = true;
       return;

@@ -107,9 +107,8 @@ struct RawCodec {
   static constexpr size_t kMaxSignal = 2 + 2 + 2 + 8 + 8 + 4 + 4;
 
   // Tag 8: one-byte code, one byte not interpreted, B2, B3.
-  template <bool kChecked = true>
   static size_t SatBlock8(ByteSpan b, SatBlock& s) {
-    FieldCursor<Order, kChecked> c(b);
+    Cursor c(b);
     s.code = c.U8();
     c.Skip(1);
     s.b2 = c.U8();
@@ -120,9 +119,8 @@ struct RawCodec {
   }
 
   // Tag 51: two-byte code, B2, B3.
-  template <bool kChecked = true>
   static size_t SatBlock51(ByteSpan b, SatBlock& s) {
-    FieldCursor<Order, kChecked> c(b);
+    Cursor c(b);
     s.code = c.U16();
     s.b2 = c.U8();
     s.b3 = c.U8();
@@ -131,9 +129,8 @@ struct RawCodec {
     return c.Result();
   }
 
-  template <bool kChecked = true>
   static size_t Signal8(ByteSpan b, SignalBlock& s) {
-    FieldCursor<Order, kChecked> c(b);
+    Cursor c(b);
     s.flags = c.U16();
     s.byte_a = (s.flags & kSig8ByteA) ? c.U8() : 0;
     s.byte_b = (s.flags & kSig8ByteB) ? c.U8() : 0;
@@ -141,9 +138,8 @@ struct RawCodec {
     return c.Result();
   }
 
-  template <bool kChecked = true>
   static size_t Signal51(ByteSpan b, SignalBlock& s) {
-    FieldCursor<Order, kChecked> c(b);
+    Cursor c(b);
     s.flags = c.U16();
     s.i16 = (s.flags & kSig51I16) ? c.I16() : 0;
     s.u16 = (s.flags & kSig51U16) ? c.U16() : 0;
@@ -311,8 +307,7 @@ struct RawCodec {
 
  private:
   // The optional values shared by both signal block kinds, each checked as it is read.
-  template <typename AnyCursor>
-  static void ReadValues(AnyCursor& c, SignalBlock& s) {
+  static void ReadValues(Cursor& c, SignalBlock& s) {
     if (s.flags & kSigCode) {
       s.code = c.F64();
       if (!CodeValueOk(s.code)) s.flags &= ~kSigCode;
