@@ -17,9 +17,9 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
-#include <exception>
 #include <mutex>
 
+#include "platform/guard_exceptions.h"
 #include "platform/platform.h"
 
 namespace vox::platform {
@@ -178,17 +178,8 @@ const char* FaultKind(int signal, int code) {
 // survive a jump.
 __attribute__((noinline)) GuardReport CallInside(GuardFrame& frame,
                                                  const std::function<void()>& fn) {
-  GuardReport report;
   t_frame = &frame;
-  try {
-    fn();
-  } catch (const std::exception& error) {
-    report.outcome = GuardOutcome::kException;
-    report.description = std::string("exception: ") + error.what();
-  } catch (...) {
-    report.outcome = GuardOutcome::kException;
-    report.description = "exception of unknown type";
-  }
+  GuardReport report = CallCatchingExceptions(fn);
   t_frame = frame.previous;
   return report;
 }

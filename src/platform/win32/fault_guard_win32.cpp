@@ -15,9 +15,9 @@
 #include <float.h>
 
 #include <cstdio>
-#include <exception>
 #include <mutex>
 
+#include "platform/guard_exceptions.h"
 #include "platform/platform.h"
 
 namespace vox::platform {
@@ -132,17 +132,8 @@ void Install() {
 // survive a jump.
 __attribute__((noinline)) GuardReport CallInside(GuardFrame& frame,
                                                  const std::function<void()>& fn) {
-  GuardReport report;
   SetCurrentFrame(&frame);
-  try {
-    fn();
-  } catch (const std::exception& error) {
-    report.outcome = GuardOutcome::kException;
-    report.description = std::string("exception: ") + error.what();
-  } catch (...) {
-    report.outcome = GuardOutcome::kException;
-    report.description = "exception of unknown type";
-  }
+  GuardReport report = CallCatchingExceptions(fn);
   SetCurrentFrame(frame.previous);
   return report;
 }
