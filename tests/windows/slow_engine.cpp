@@ -5,24 +5,13 @@
 
 #include <atomic>
 
-#include "vox/vox_engine.h"
+#include "test_engine.h"
 
 namespace {
 std::atomic<bool> g_break{false};
 }
 
-VOX_ENGINE_EXPORT int32_t VOX_CALL _eng_GetEngineVOXVersion(void) {
-  return VOX_ENGINE_INTERFACE_VERSION;
-}
-VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetEngineDLLVersion(void) {
-  return 1;
-}
-VOX_ENGINE_EXPORT const char* VOX_CALL _eng_GetEngineInternalName(void) {
-  return "slow";
-}
-VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_GetEngineCapability(void) {
-  return 0;
-}
+TEST_ENGINE_REQUIRED_FUNCTIONS(VOX_ENGINE_INTERFACE_VERSION)
 
 VOX_ENGINE_EXPORT uint32_t VOX_CALL _eng_BreakProcess(void) {
   g_break.store(true);
